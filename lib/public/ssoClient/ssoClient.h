@@ -1,0 +1,10 @@
+#ifndef SSOCLIENT_SSOCLIENT_H
+#define SSOCLIENT_SSOCLIENT_H
+
+// Umbrella header of the single sign-on client library.
+#include "ssoClient/Exceptions.h"
+#include "ssoClient/Logger.h"
+#include "ssoClient/PrincipalId.h"
+#include "ssoClient/SamlToken.h"
+
+#endif

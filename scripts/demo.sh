@@ -1,0 +1,10 @@
+#!/usr/bin/env bash
+# Builds the library and its command-line tool, then runs the demo.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+
+bash scripts/install-deps.sh
+
+cmake -S . -B build -DCMAKE_BUILD_TYPE=RelWithDebInfo >/dev/null
+cmake --build build -j "$(nproc)" --target ssoclient-demo
+./build/tools/demo/ssoclient-demo "$@"
