@@ -6,5 +6,6 @@
 #include "ssoClient/Logger.h"
 #include "ssoClient/PrincipalId.h"
 #include "ssoClient/SamlToken.h"
+#include "ssoClient/TokenSpec.h"
 
 #endif

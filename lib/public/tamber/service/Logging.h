@@ -40,7 +40,7 @@ class TAMBER_API Logger : public Object {
   // Hands the message to the manager's sink when the level allows it.
   void Emit(int level, const std::string& message) const;
 
- Logger(const LogManager* manager, const std::string& name, int level, int traceLevel);
+  Logger(const LogManager* manager, const std::string& name, int level, int traceLevel);
 
  private:
   const LogManager* _manager;
@@ -59,6 +59,8 @@ class TAMBER_API LogManager : public Object {
   virtual void GetLogger(const std::string& name, int traceLevel, Ref<Logger>& logger) = 0;
   // Installs the sink for every logger; an empty function restores stderr.
   virtual void SetSink(const LogSink& sink) = 0;
+  // The installed sink; empty while messages go to stderr.
+  virtual LogSink GetSink() const = 0;
   // The level given to loggers created from now on.
   virtual void SetDefaultLevel(int level) = 0;
   // Writes one message of `logger` to the current sink.

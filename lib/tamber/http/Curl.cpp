@@ -1,0 +1,29 @@
+#include "tamber/http/Curl.h"
+
+#include <mutex>
+#include <string>
+
+#include "tamber/Exception.h"
+
+namespace Tamber {
+namespace Http {
+namespace Curl {
+
+void GlobalInit() {
+  static std::once_flag once;
+  static CURLcode result = CURLE_OK;
+  std::call_once(once, [] { result = curl_global_init(CURL_GLOBAL_DEFAULT); });
+  if (result != CURLE_OK) {
+    throw InvalidStateException(std::string("libcurl could not be initialised: ") + curl_easy_strerror(result));
+  }
+}
+
+void Check(CURLcode code, const char* option) {
+  if (code != CURLE_OK) {
+    throw InvalidStateException(std::string("libcurl refused ") + option + ": " + curl_easy_strerror(code));
+  }
+}
+
+}  // namespace Curl
+}  // namespace Http
+}  // namespace Tamber

@@ -1,0 +1,85 @@
+#include "tamber/xml/security/Algorithms.h"
+
+#include <openssl/evp.h>
+#include <xmlsec/openssl/crypto.h>
+
+namespace Tamber {
+namespace Xml {
+namespace Security {
+
+namespace {
+
+std::vector<xmlSecTransformId> Canonicalizations() {
+  return {xmlSecTransformInclC14NId, xmlSecTransformInclC14NWithCommentsId, xmlSecTransformExclC14NId,
+          xmlSecTransformExclC14NWithCommentsId};
+}
+
+std::vector<SignatureMethod> SignatureMethods() {
+  return {{xmlSecOpenSSLTransformRsaSha256Id, EVP_PKEY_RSA},   {xmlSecOpenSSLTransformRsaSha384Id, EVP_PKEY_RSA},
+          {xmlSecOpenSSLTransformRsaSha512Id, EVP_PKEY_RSA},   {xmlSecOpenSSLTransformEcdsaSha256Id, EVP_PKEY_EC},
+          {xmlSecOpenSSLTransformEcdsaSha384Id, EVP_PKEY_EC}, {xmlSecOpenSSLTransformEcdsaSha512Id, EVP_PKEY_EC}};
+}
+
+std::vector<xmlSecTransformId> Digests() {
+  return {xmlSecOpenSSLTransformSha256Id, xmlSecOpenSSLTransformSha384Id, xmlSecOpenSSLTransformSha512Id};
+}
+
+bool HasHref(xmlSecTransformId transform, const std::string& uri) {
+  return uri == reinterpret_cast<const char*>(transform->href);
+}
+
+xmlSecTransformId FindIn(const std::vector<xmlSecTransformId>& transforms, const std::string& uri) {
+  for (xmlSecTransformId transform : transforms) {
+    if (HasHref(transform, uri)) return transform;
+  }
+  return xmlSecTransformIdUnknown;
+}
+
+}  // namespace
+
+xmlSecTransformId FindCanonicalizationMethod(const std::string& uri) {
+  // The inclusive form's identifier is handed around both with and without a final "#".
+  if (!uri.empty() && uri.back() == '#' && HasHref(xmlSecTransformInclC14NId, uri.substr(0, uri.size() - 1))) {
+    return xmlSecTransformInclC14NId;
+  }
+  return FindIn(Canonicalizations(), uri);
+}
+
+SignatureMethod FindSignatureMethod(const std::string& uri) {
+  for (const SignatureMethod& method : SignatureMethods()) {
+    if (HasHref(method.transform, uri)) return method;
+  }
+  return {xmlSecTransformIdUnknown, EVP_PKEY_NONE};
+}
+
+xmlSecTransformId FindDigestMethod(const std::string& uri) { return FindIn(Digests(), uri); }
+
+xmlSecTransformId FindReferenceTransform(const std::string& uri) {
+  if (HasHref(xmlSecTransformEnvelopedId, uri)) return xmlSecTransformEnvelopedId;
+  return FindIn(Canonicalizations(), uri);
+}
+
+std::vector<xmlSecTransformId> SignedInfoTransforms() {
+  std::vector<xmlSecTransformId> transforms = Canonicalizations();
+  for (const SignatureMethod& method : SignatureMethods()) transforms.push_back(method.transform);
+  return transforms;
+}
+
+std::vector<xmlSecTransformId> ReferenceTransforms() {
+  std::vector<xmlSecTransformId> transforms = Canonicalizations();
+  transforms.push_back(xmlSecTransformEnvelopedId);
+  for (xmlSecTransformId digest : Digests()) transforms.push_back(digest);
+  return transforms;
+}
+
+bool IsExclusiveCanonicalization(xmlSecTransformId transform) {
+  return transform == xmlSecTransformExclC14NId || transform == xmlSecTransformExclC14NWithCommentsId;
+}
+
+bool CanonicalizationKeepsComments(xmlSecTransformId transform) {
+  return transform == xmlSecTransformInclC14NWithCommentsId || transform == xmlSecTransformExclC14NWithCommentsId;
+}
+
+}  // namespace Security
+}  // namespace Xml
+}  // namespace Tamber

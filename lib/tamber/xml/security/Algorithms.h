@@ -1,0 +1,44 @@
+#ifndef TAMBER_XML_SECURITY_ALGORITHMS_H
+#define TAMBER_XML_SECURITY_ALGORITHMS_H
+
+// The algorithms the layer accepts in XML signatures, by their xmlsec transform classes (whose
+// hrefs are the algorithm URIs). Everything not listed is refused.
+
+#include <string>
+#include <vector>
+
+#include <xmlsec/transforms.h>
+
+namespace Tamber {
+namespace Xml {
+namespace Security {
+
+struct SignatureMethod {
+  xmlSecTransformId transform;
+  int keyType;  // EVP_PKEY_RSA or EVP_PKEY_EC
+};
+
+// Canonical XML 1.0 and Exclusive XML Canonicalization 1.0, with and without comments. The
+// inclusive identifier is also accepted followed by "#". Null when not accepted.
+xmlSecTransformId FindCanonicalizationMethod(const std::string& uri);
+// RSA and ECDSA with SHA-256/384/512; null transform when not accepted.
+SignatureMethod FindSignatureMethod(const std::string& uri);
+// SHA-256/384/512; null when not accepted.
+xmlSecTransformId FindDigestMethod(const std::string& uri);
+// Enveloped signature and the canonicalisations; null when not accepted.
+xmlSecTransformId FindReferenceTransform(const std::string& uri);
+
+// Everything a ds:SignedInfo may use (canonicalisation and signature methods), and everything a
+// ds:Reference may use (transforms and digests), for xmlsec's allow-lists.
+std::vector<xmlSecTransformId> SignedInfoTransforms();
+std::vector<xmlSecTransformId> ReferenceTransforms();
+
+// The canonicalisation transforms.
+bool IsExclusiveCanonicalization(xmlSecTransformId transform);
+bool CanonicalizationKeepsComments(xmlSecTransformId transform);
+
+}  // namespace Security
+}  // namespace Xml
+}  // namespace Tamber
+
+#endif
