@@ -162,7 +162,7 @@ void CheckTokenProperties(const SamlAssertionType& assertion, long long clockTol
   CheckDelegation(confirmation, conditions.delegationRestriction);
 }
 
-void SamlTokenImpl::ValidateSignature(Signature* signature, KeyInfoResolver* resolver, const ElementNode* assertion) {
+void ValidateSignature(Signature* signature, KeyInfoResolver* resolver, const ElementNode* assertion) {
   std::vector<ElementNode*> verifiedElements;
   bool valid;
   try {

@@ -46,10 +46,6 @@ class SamlTokenImpl : public SamlToken {
  private:
   void InitializeFromDom(Tamber::Xml::ElementNode* element, Tamber::Xml::Security::KeyInfoResolver* resolver,
                          long long clockToleranceSec);
-  // Checks the signature cryptographically and that it is the assertion itself that it covers.
-  static void ValidateSignature(Tamber::Xml::Security::Signature* signature,
-                                Tamber::Xml::Security::KeyInfoResolver* resolver,
-                                const Tamber::Xml::ElementNode* assertion);
   void PopulateTokenAttribute(const AttributeType& attribute);
 
   std::string _xml;
@@ -72,6 +68,10 @@ class SamlTokenImpl : public SamlToken {
 // The version, id, validity window (widened by the tolerance on both sides), bearer subject
 // validity and delegation rules of a parsed assertion; the clock is read once.
 void CheckTokenProperties(const SamlAssertionType& assertion, long long clockToleranceSec);
+// Verifies the signature with the resolver's keys, and that what it verified is the assertion
+// itself. Raises InvalidSignatureException, or ParseException when it covers something else.
+void ValidateSignature(Tamber::Xml::Security::Signature* signature, Tamber::Xml::Security::KeyInfoResolver* resolver,
+                       const Tamber::Xml::ElementNode* assertion);
 
 }  // namespace SsoClient
 

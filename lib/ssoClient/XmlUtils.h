@@ -25,7 +25,7 @@ class NodeFilter {
 };
 
 // Skips comments and text nodes made only of tab, line feed, carriage return and space.
-class SkipWsAndCommentsFilter : public NodeFilter {
+class SkipWsAndCommentsFilter final : public NodeFilter {
  public:
   bool Accept(Tamber::Xml::Node* node) const override;
 };
@@ -38,9 +38,9 @@ class NodeFilterIterator {
   NodeFilterIterator(Tamber::Xml::Node* node, const boost::shared_ptr<const NodeFilter>& filter)
       : _node(node), _filter(filter) {}
 
-  // The next accepted sibling, or the end (null).
+  // The next accepted sibling, or the end (null). At the end it stays there.
   NodeFilterIterator& MoveToSibling();
-  // The first accepted child, or the end. Must not be called at the end.
+  // The first accepted child, or the end. At the end it stays there.
   NodeFilterIterator& MoveToChild();
   // A copy moved to the first accepted child.
   NodeFilterIterator GetChild() const;
@@ -67,8 +67,8 @@ Tamber::Xml::TextNode* GetTextNode(const Tamber::Xml::Node* node);
 std::string GetText(const Tamber::Xml::TextNode* node);
 
 // Resolves a qualified name found on or in `element`: an unprefixed name takes
-// `defaultNamespace`; a prefix is looked up in scope at `element`. An unbound prefix raises
-// ParseException naming the element and its position; `result` is then unchanged.
+// `defaultNamespace`; a prefix is looked up in scope at `element`. An unbound or empty prefix
+// raises ParseException naming the element and its position; `result` is then unchanged.
 void ResolveQName(const Tamber::Xml::ElementNode* element, const std::string& name,
                   const std::string& defaultNamespace, Tamber::Xml::QName& result);
 

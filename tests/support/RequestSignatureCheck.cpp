@@ -7,16 +7,19 @@
 #include <cstdlib>
 #include <fstream>
 #include <memory>
+#include <stdexcept>
 
 #include <libxml/parser.h>
 #include <libxml/tree.h>
 #include <libxml/valid.h>
 #include <xmlsec/app.h>
+#include <xmlsec/crypto.h>
 #include <xmlsec/xmldsig.h>
 #include <xmlsec/xmltree.h>
 
 #include "ssoClient/SamlConstants.h"
 #include "ssoClient/WireConstants.h"
+#include "tamber/StringUtil.h"
 #include "tamber/xml/security/XmlSec.h"
 
 namespace TestSupport {
@@ -52,9 +55,27 @@ void RegisterWsuIds(xmlDocPtr doc, xmlNodePtr node) {
   }
 }
 
+std::string ToPem(const Tamber::Crypto::Certificate& certificate) {
+  const std::string base64 = Tamber::StringUtil::Base64Encode(certificate.GetDer());
+  std::string pem = "-----BEGIN CERTIFICATE-----\n";
+  for (size_t i = 0; i < base64.size(); i += 64) pem += base64.substr(i, 64) + "\n";
+  return pem + "-----END CERTIFICATE-----\n";
+}
+
+// A new file under /tmp holding `content`; its path, or empty on failure.
+std::string WriteTemporaryFile(const std::string& content) {
+  char path[] = "/tmp/ssoclient-request-XXXXXX";
+  const int fd = mkstemp(path);
+  if (fd < 0) return "";
+  close(fd);
+  std::ofstream(path, std::ios::binary) << content;
+  return path;
+}
+
 }  // namespace
 
-RequestSignatureResult VerifyRequestSignature(const std::string& requestXml, const std::string& certificatePem) {
+RequestSignatureResult VerifyRequestSignature(const std::string& requestXml,
+                                              const Tamber::Crypto::Certificate& certificate) {
   Tamber::Xml::Security::EnsureXmlSecInitialized();
   RequestSignatureResult result;
   std::unique_ptr<xmlDoc, Deleter> doc(
@@ -73,9 +94,9 @@ RequestSignatureResult VerifyRequestSignature(const std::string& requestXml, con
   }
   std::unique_ptr<xmlSecDSigCtx, Deleter> context(xmlSecDSigCtxCreate(nullptr));
   context->enabledReferenceUris = xmlSecTransformUriTypeSameDocument;
-  context->signKey = xmlSecCryptoAppKeyLoadMemory(reinterpret_cast<const xmlSecByte*>(certificatePem.data()),
-                                                  static_cast<xmlSecSize>(certificatePem.size()),
-                                                  xmlSecKeyDataFormatCertPem, nullptr, nullptr, nullptr);
+  const std::vector<unsigned char>& der = certificate.GetDer();
+  context->signKey = xmlSecCryptoAppKeyLoadMemory(der.data(), static_cast<xmlSecSize>(der.size()),
+                                                  xmlSecKeyDataFormatCertDer, nullptr, nullptr, nullptr);
   if (context->signKey == nullptr) {
     result.error = "the certificate could not be loaded";
     return result;
@@ -93,16 +114,30 @@ RequestSignatureResult VerifyRequestSignature(const std::string& requestXml, con
   return result;
 }
 
-ToolResult VerifyRequestWithXmlSecTool(const std::string& requestXml, const std::string& certificatePemPath) {
-  char path[] = "/tmp/ssoclient-request-XXXXXX";
-  const int fd = mkstemp(path);
+std::string AlterFirstTextByteOf(const std::string& requestXml, const std::string& qualifiedName) {
+  const size_t start = requestXml.find("<" + qualifiedName);
+  size_t text = start == std::string::npos ? std::string::npos : requestXml.find('>', start);
+  while (text != std::string::npos && text + 1 < requestXml.size() && requestXml[text + 1] == '<') {
+    text = requestXml.find('>', text + 1);
+  }
+  if (text == std::string::npos || text + 1 >= requestXml.size()) {
+    throw std::invalid_argument("no text inside <" + qualifiedName + ">");
+  }
+  std::string altered = requestXml;
+  altered[text + 1] = static_cast<char>(altered[text + 1] ^ 0x01);
+  return altered;
+}
+
+ToolResult VerifyRequestWithXmlSecTool(const std::string& requestXml, const Tamber::Crypto::Certificate& certificate) {
   ToolResult result;
-  if (fd < 0) {
+  const std::string path = WriteTemporaryFile(requestXml);
+  const std::string certificatePemPath = WriteTemporaryFile(ToPem(certificate));
+  if (path.empty() || certificatePemPath.empty()) {
+    if (!path.empty()) unlink(path.c_str());
+    if (!certificatePemPath.empty()) unlink(certificatePemPath.c_str());
     result.output = "cannot create a temporary file";
     return result;
   }
-  close(fd);
-  std::ofstream(path, std::ios::binary) << requestXml;
 
   const std::string command = std::string("xmlsec1 --verify --enabled-reference-uris same-doc") +
                               " --id-attr:Id '" + Wire::kSoapEnvelope.uri + ":Body'" +
@@ -118,7 +153,8 @@ ToolResult VerifyRequestWithXmlSecTool(const std::string& requestXml, const std:
     const int status = pclose(pipe);
     result.exitCode = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
   }
-  unlink(path);
+  unlink(path.c_str());
+  unlink(certificatePemPath.c_str());
   return result;
 }
 

@@ -8,6 +8,8 @@
 #include <string>
 #include <vector>
 
+#include "tamber/crypto/Certificate.h"
+
 namespace TestSupport {
 
 struct RequestSignatureResult {
@@ -21,20 +23,26 @@ struct RequestSignatureResult {
 };
 
 // Verifies the ds:Signature that is a direct child of soapenv:Header/wsse:Security with the
-// public key of the PEM certificate `certificatePem` (the key information of the request is not
-// consulted: the caller says whose key must have signed). wsu:Id attributes are registered as
-// IDs; only same-document references are followed.
-RequestSignatureResult VerifyRequestSignature(const std::string& requestXml, const std::string& certificatePem);
+// public key of `certificate` (the key information of the request is not consulted: the caller
+// says whose key must have signed). wsu:Id attributes are registered as IDs; only same-document
+// references are followed.
+RequestSignatureResult VerifyRequestSignature(const std::string& requestXml,
+                                              const Tamber::Crypto::Certificate& certificate);
+
+// `requestXml` with one byte changed: the first character of the first text inside the first
+// element whose start tag begins "<" + `qualifiedName`, flipped in its lowest bit ('2' becomes
+// '3', 'u' becomes 't'). Raises std::invalid_argument when there is no such text.
+std::string AlterFirstTextByteOf(const std::string& requestXml, const std::string& qualifiedName);
 
 struct ToolResult {
   int exitCode = -1;
   std::string output;
 };
 
-// Runs `xmlsec1 --verify` on `requestXml` with the public key of the PEM certificate file
-// `certificatePemPath`, registering wsu:Id of soapenv:Body and wsu:Timestamp and starting at the
-// signature whose Id is "holderOfKeyProofSignature".
-ToolResult VerifyRequestWithXmlSecTool(const std::string& requestXml, const std::string& certificatePemPath);
+// Runs `xmlsec1 --verify` on `requestXml` with the public key of `certificate`, registering the
+// wsu:Id of soapenv:Body and wsu:Timestamp and starting at the signature whose Id is
+// "holderOfKeyProofSignature". Exit code 0 means verified.
+ToolResult VerifyRequestWithXmlSecTool(const std::string& requestXml, const Tamber::Crypto::Certificate& certificate);
 
 }  // namespace TestSupport
 

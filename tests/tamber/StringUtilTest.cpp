@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 #include <openssl/evp.h>
 
+#include <random>
 #include <regex>
 #include <set>
 
@@ -58,6 +59,28 @@ TEST(Base64Test, SkipsWhitespaceAnywhere) {
   EXPECT_EQ(Base64Decode("Zm9v\r\nYmFy"), Bytes("foobar"));
   EXPECT_EQ(Base64Decode(" Z m\t9v\nYg =\r\n= \n"), Bytes("foob"));
   EXPECT_EQ(Base64Decode(" \t\r\n"), Bytes(""));
+}
+
+// Strictness means one encoding per byte string: whatever is accepted re-encodes to the same
+// text, whitespace aside.
+TEST(Base64Test, AcceptsOnlyCanonicalText) {
+  const char alphabet[] = "AQgw/+=\n !";
+  std::mt19937 random(4648);
+  int accepted = 0;
+  for (int i = 0; i < 20000; ++i) {
+    std::string text(random() % 13, ' ');
+    for (char& c : text) c = alphabet[random() % (sizeof alphabet - 1)];
+    std::string significant;
+    for (char c : text) {
+      if (c != ' ' && c != '\n') significant += c;
+    }
+    try {
+      ASSERT_EQ(Base64Encode(Base64Decode(text)), significant) << text;
+      ++accepted;
+    } catch (const Base64FormatException&) {
+    }
+  }
+  EXPECT_GT(accepted, 1000);
 }
 
 struct RefusalCase {

@@ -160,9 +160,10 @@ int main(int argc, char** argv) {
   indentedRecord.indent = true;
   const std::string indented = issue(indentedRecord, sts);
   out.Write("valid-indented.xml", indented);
-  // Comments are outside what exclusive canonicalisation without comments signs.
-  std::string commented = ReplaceOnce(indented, "</saml2:Issuer>", "</saml2:Issuer>\n  <!-- signed below -->");
-  commented = ReplaceOnce(commented, "\n  <saml2:Conditions", "\n  <!-- conditions -->\n  <saml2:Conditions");
+  // Comments are outside what exclusive canonicalisation without comments signs; the whitespace
+  // around them is signed and stays as it was.
+  std::string commented = ReplaceOnce(indented, "</saml2:Issuer>", "</saml2:Issuer><!-- signed below -->");
+  commented = ReplaceOnce(commented, "\n  <saml2:Conditions", "<!-- conditions -->\n  <saml2:Conditions");
   out.Write("valid-with-comments.xml", commented);
 
   // Signed by keys that are not trusted, or not the key named in KeyInfo.

@@ -25,15 +25,22 @@ extern const char URI_NAME_FORMAT[];
 
 // A delegate of the chain; also the delegate id (its instant unused there).
 struct DelegateRecord {
+  DelegateRecord(const std::string& upn, const Tamber::System::DateTime& delegationInstant)
+      : upn(upn), delegationInstant(delegationInstant) {}
+
   std::string upn;
   Tamber::System::DateTime delegationInstant;
   std::string format = SsoClient::Saml::UPN_FORMAT;
 };
 
 struct AttributeRecord {
+  AttributeRecord(const std::string& name, const std::vector<std::string>& values,
+                  const std::string& nameFormat = URI_NAME_FORMAT, const std::string& friendlyName = "")
+      : name(name), values(values), nameFormat(nameFormat), friendlyName(friendlyName) {}
+
   std::string name;
   std::vector<std::string> values;
-  std::string nameFormat = URI_NAME_FORMAT;
+  std::string nameFormat;
   // Omitted when empty.
   std::string friendlyName;
 };

@@ -29,7 +29,8 @@ struct SSOCLIENT_API HolderOfKeyConfig {
 // ten-minute, non-delegable, non-renewable token without audience restriction or advice, with
 // the confirmation the service's key material allows. Copies are deep.
 struct SSOCLIENT_API TokenSpec {
-  enum Confirmation {
+  // A fixed underlying type, so that any int cast to it is a valid value (see BEARER).
+  enum Confirmation : int {
     // Holder-of-key when the service has key material, bearer otherwise.
     CONFIRMATION_DEFAULT = 0,
     // Bearer; every value other than CONFIRMATION_DEFAULT has this effect.

@@ -18,6 +18,14 @@ void GlobalInit() {
   }
 }
 
+void Append(SlistPtr& list, const std::string& line) {
+  curl_slist* extended = curl_slist_append(list.get(), line.c_str());
+  if (extended == nullptr) throw InvalidStateException("libcurl could not allocate a list entry");
+  // On success the old head is part of the extended list.
+  static_cast<void>(list.release());
+  list.reset(extended);
+}
+
 void Check(CURLcode code, const char* option) {
   if (code != CURLE_OK) {
     throw InvalidStateException(std::string("libcurl refused ") + option + ": " + curl_easy_strerror(code));

@@ -4,6 +4,7 @@
 // Internal helpers over libcurl for the HTTP client of the layer.
 
 #include <memory>
+#include <string>
 
 #include <curl/curl.h>
 
@@ -15,14 +16,22 @@ namespace Curl {
 // InvalidStateException when libcurl cannot be initialised.
 void GlobalInit();
 
-struct Deleter {
+// CURL and CURLSH are both void, hence one deleter each.
+struct EasyDeleter {
   void operator()(CURL* easy) const { curl_easy_cleanup(easy); }
+};
+struct ShareDeleter {
   void operator()(CURLSH* share) const { curl_share_cleanup(share); }
+};
+struct SlistDeleter {
   void operator()(curl_slist* list) const { curl_slist_free_all(list); }
 };
-using EasyPtr = std::unique_ptr<CURL, Deleter>;
-using SharePtr = std::unique_ptr<CURLSH, Deleter>;
-using SlistPtr = std::unique_ptr<curl_slist, Deleter>;
+using EasyPtr = std::unique_ptr<CURL, EasyDeleter>;
+using SharePtr = std::unique_ptr<CURLSH, ShareDeleter>;
+using SlistPtr = std::unique_ptr<curl_slist, SlistDeleter>;
+
+// Appends a line to a libcurl string list; raises InvalidStateException when out of memory.
+void Append(SlistPtr& list, const std::string& line);
 
 // Raises InvalidStateException naming the option when libcurl refuses it: every option the
 // layer sets is needed for its safety, so a libcurl that lacks one must not be used.

@@ -4,7 +4,7 @@
 #include <libxml/xmlsave.h>
 
 #include "tamber/xml/LibXml.h"
-#include "tamber/xml/Names.h"
+#include "tamber/xml/Namespace.h"
 #include "tamber/xml/NodeImpl.h"
 #include "tamber/xml/XmlText.h"
 

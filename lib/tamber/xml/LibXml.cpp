@@ -5,7 +5,7 @@
 #include <libxml/parser.h>
 
 #include "tamber/Panic.h"
-#include "tamber/xml/Names.h"
+#include "tamber/xml/Namespace.h"
 #include "tamber/xml/NodeImpl.h"
 #include "tamber/xml/TreeWalk.h"
 

@@ -129,8 +129,8 @@ class DocumentImpl : public NodeImpl<Document> {
   std::vector<DocumentImpl*> _detachedTrees;
 };
 
-// The parsed position of an element, kept in its `psvi` field (unused otherwise): libxml2 keeps no
-// column and clamps the line at 65535.
+// The parsed position of an element (where its start tag ends, as a SAX locator reports it), kept
+// in its `psvi` field (unused otherwise): libxml2 keeps no column and clamps the line at 65535.
 void SetParsedPosition(xmlNodePtr element, unsigned line, unsigned column);
 
 // Moves `node` (with its subtree) from its document into `destination`, as a new last child of

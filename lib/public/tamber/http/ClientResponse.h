@@ -14,9 +14,9 @@ namespace Http {
 class TAMBER_API ClientResponse : public Reader {
  public:
   virtual int GetStatusCode() const = 0;
-  // The reason phrase of the status line as the server sent it, with every byte that is not a
-  // printable character, space or tab replaced by '?' and cut to 256 bytes, since it is
-  // untrusted text that ends up in messages. Empty when the server sent none.
+  // The reason phrase of the status line as the server sent it, cut to 256 bytes, with every
+  // byte that is not printable ASCII, space or tab replaced by '?', since it is untrusted text
+  // that ends up in messages. Empty when the server sent none.
   virtual const std::string& GetReasonPhrase() const = 0;
 };
 

@@ -1,6 +1,7 @@
 #include "tamber/xml/security/TrustChainKeyResolver.h"
 
 #include <algorithm>
+#include <cstdint>
 
 #include <openssl/err.h>
 #include <openssl/sha.h>

@@ -34,7 +34,10 @@ void OnXmlSecError(const char* /*file*/, int /*line*/, const char* function, con
   if (errorObject != nullptr && *errorObject != '\0' && std::string(errorObject) != "unknown") {
     text += " (" + std::string(errorObject) + ")";
   }
-  if (message != nullptr && *message != '\0') text += "; " + std::string(message);
+  std::string detail = message != nullptr ? message : "";
+  detail.erase(0, detail.find_first_not_of(' '));
+  detail.erase(detail.find_last_not_of(' ') + 1);
+  if (!detail.empty()) text += "; " + detail;
   currentCapture->Record(text);
 }
 
@@ -44,10 +47,13 @@ void EnsureXmlSecInitialized() {
   static std::once_flag once;
   std::call_once(once, [] {
     EnsureLibXmlInitialized();
+    xmlSecErrorsDefaultCallbackEnableOutput(0);
     xmlSecErrorsSetCallback(&OnXmlSecError);
     if (xmlSecInit() < 0 || xmlSecCheckVersion() != 1 || xmlSecCryptoAppInit(nullptr) < 0 || xmlSecCryptoInit() < 0) {
       throw XmlSecurityException("xmlsec cannot be initialised");
     }
+    // The OpenSSL back end installs its own callback while initialising: ours comes last.
+    xmlSecErrorsSetCallback(&OnXmlSecError);
     ERR_clear_error();
   });
 }

@@ -6,6 +6,7 @@
 #include <memory>
 #include <string>
 
+#include <openssl/evp.h>
 #include <xmlsec/keys.h>
 #include <xmlsec/xmldsig.h>
 

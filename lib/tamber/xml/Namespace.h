@@ -1,5 +1,5 @@
-#ifndef TAMBER_XML_NAMES_H
-#define TAMBER_XML_NAMES_H
+#ifndef TAMBER_XML_NAMESPACE_H
+#define TAMBER_XML_NAMESPACE_H
 
 // Names of elements and attributes in a tree that may hold names still waiting for their
 // namespace declaration: such a name is kept whole ("p:local") with no namespace, the way libxml2

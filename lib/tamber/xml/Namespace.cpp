@@ -1,4 +1,4 @@
-#include "tamber/xml/Names.h"
+#include "tamber/xml/Namespace.h"
 
 #include <cstring>
 
@@ -92,7 +92,8 @@ void BindUnboundNames(xmlNodePtr root) {
     if (node->ns == nullptr) {
       const xmlChar* colon = PendingColon(node);
       if (colon == nullptr) {
-        node->ns = FindDeclaration(node, nullptr);
+        // Written only when something changes: parsed trees are read by several threads at once.
+        if (xmlNsPtr ns = FindDeclaration(node, nullptr)) node->ns = ns;
       } else {
         const std::string prefix(AsChars(node->name), colon - node->name);
         xmlNsPtr ns = FindDeclaration(node, reinterpret_cast<const xmlChar*>(prefix.c_str()));
