@@ -1,10 +1,7 @@
 #include "support/HttpsTestServer.h"
 
-// The Debian build of cpp-httplib is a compiled library; its classes must be seen with the
-// options it was built with.
-#define CPPHTTPLIB_OPENSSL_SUPPORT
-#define CPPHTTPLIB_ZLIB_SUPPORT
-#define CPPHTTPLIB_BROTLI_SUPPORT
+// Debian's cpp-httplib is a compiled library: its pkg-config flags carry the options it was
+// built with (OpenSSL, zlib, brotli), which its classes must be seen with.
 #include <httplib.h>
 
 #include <arpa/inet.h>
