@@ -23,7 +23,7 @@ namespace InternalApi {
 // an initial request carrying the token specification) and negotiating (the next step sends a
 // continued request of the STS's context). An answer without context id starts it over. Every
 // step goes through the one session, so that all share its cookies.
-class GssNegotiationContextImpl : public virtual GssNegotiationContext {
+class GssNegotiationContextImpl final : public virtual GssNegotiationContext {
  public:
   // Raises Tamber::InvalidArgumentException when `trustedCertificates` is empty.
   GssNegotiationContextImpl(const TokenSpec& spec, const boost::shared_ptr<const RequestBuilder>& requestBuilder,

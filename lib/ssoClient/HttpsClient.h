@@ -48,7 +48,7 @@ class Transport {
   ~Transport() = default;
 };
 
-class HttpsClient : public Transport {
+class HttpsClient final : public Transport {
  public:
   // `url` is the STS URL (http or https); an https URL needs `sslContext`. `sslParameter` pins
   // the STS certificate (see Tamber::Http::CreateSSLConnectionSpec). `timeout` bounds each
@@ -65,7 +65,7 @@ class HttpsClient : public Transport {
   long long _timeout;
 };
 
-class HttpsSession : public TransportSession {
+class HttpsSession final : public TransportSession {
  public:
   HttpsSession(Tamber::Http::ConnectionSpec* spec, const std::string& path, long long timeout);
 

@@ -28,7 +28,7 @@ class ResponseHandler {
 
 // Stateless; one instance serves every operation and thread. Out-parameters are written only on
 // success.
-class ResponseHandlerImpl : public ResponseHandler {
+class ResponseHandlerImpl final : public ResponseHandler {
  public:
   void HandleAcquireTokenResponse(Tamber::Reader* response, std::string& token) const override;
   bool HandleValidateSubjectResponse(Tamber::Reader* response) const override;

@@ -16,7 +16,7 @@ namespace SsoClient {
 
 // A validated token. It exists only fully built: every check runs in the constructor, and any
 // failure throws out of it.
-class SamlTokenImpl : public SamlToken {
+class SamlTokenImpl final : public SamlToken {
  public:
   // Parses `xml` and validates its root element; ToXml() returns `xml` as given.
   SamlTokenImpl(const std::string& xml, Tamber::Xml::Security::KeyInfoResolver* resolver,

@@ -20,7 +20,7 @@ class TransportSession;
 // The token service over a request builder, a transport and a response handler. Immutable after
 // construction; copies share the three collaborators, which is how an asynchronous operation
 // keeps the service alive on its worker thread.
-class SecurityTokenServiceImpl : public SecurityTokenService {
+class SecurityTokenServiceImpl final : public SecurityTokenService {
  public:
   SecurityTokenServiceImpl(const boost::shared_ptr<const RequestBuilder>& requestBuilder,
                            const boost::shared_ptr<const Transport>& transport,

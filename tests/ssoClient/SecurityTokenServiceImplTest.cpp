@@ -361,13 +361,23 @@ INSTANTIATE_TEST_SUITE_P(
 
 // Hands the service a fixed assertion text, as no real answer can (the real handler returns the
 // canonical form of an element, which is always well-formed).
-class FixedAssertionHandler : public ResponseHandlerImpl {
+class FixedAssertionHandler final : public ResponseHandler {
  public:
   explicit FixedAssertionHandler(const std::string& assertion) : _assertion(assertion) {}
   void HandleAcquireTokenResponse(Tamber::Reader*, std::string& token) const override { token = _assertion; }
+  bool HandleValidateSubjectResponse(Tamber::Reader* response) const override {
+    return _real.HandleValidateSubjectResponse(response);
+  }
+  void HandleRenewTokenResponse(Tamber::Reader* response, std::string& token) const override {
+    _real.HandleRenewTokenResponse(response, token);
+  }
+  void HandleSPNegoResponse(Tamber::Reader* response, SPNegoResponse& result) const override {
+    _real.HandleSPNegoResponse(response, result);
+  }
 
  private:
   std::string _assertion;
+  ResponseHandlerImpl _real;
 };
 
 struct AssertionCase {
