@@ -106,12 +106,7 @@ class Delivery {
   boost::shared_ptr<Tamber::Exception> _error;
 };
 
-boost::optional<HolderOfKeyConfig> ClientKeyMaterial() {
-  HolderOfKeyConfig config;
-  config.privateKey = TestSupport::LoadTestKeyPair("client").key;
-  config.certificate = TestSupport::LoadTestKeyPair("client").certificate;
-  return config;
-}
+using TestSupport::ClientKeyMaterial;
 
 TokenSpec Spec() {
   TokenSpec spec;

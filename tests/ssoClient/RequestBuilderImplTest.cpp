@@ -46,12 +46,7 @@ std::string Mask(const std::string& text) {
   return std::regex_replace(masked, signature, "$1{SIGNATURE}$3");
 }
 
-boost::optional<HolderOfKeyConfig> ClientKeyMaterial() {
-  HolderOfKeyConfig config;
-  config.privateKey = TestSupport::LoadTestKeyPair("client").key;
-  config.certificate = TestSupport::LoadTestKeyPair("client").certificate;
-  return config;
-}
+using TestSupport::ClientKeyMaterial;
 
 TokenSpec Spec() {
   TokenSpec spec;

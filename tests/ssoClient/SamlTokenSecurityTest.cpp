@@ -3,18 +3,11 @@
 // Tokens an attacker could hand a relying party, from tests/data/tokens (see generate.sh there),
 // and the trusted tokens they are twins of.
 
-#include <arpa/inet.h>
-#include <fcntl.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <unistd.h>
-
-#include <cerrno>
-
 #include <gtest/gtest.h>
 
 #include "ssoClient/Exceptions.h"
 #include "support/FixedClock.h"
+#include "support/LoopbackListener.h"
 #include "support/TestTokens.h"
 #include "tamber/xml/Dom.h"
 
@@ -160,43 +153,15 @@ TEST_F(GeneratedVectorTest, ElementWithFiftyThousandAttributesIsRefused) {
   ExpectVerdict(token, NOT_XML, "XML parse error at line 1, column 7752: an element has more than 256 attributes");
 }
 
-// A listener on the loopback that must see no connection while a token names it.
-class LoopbackListener {
- public:
-  LoopbackListener() : _socket(socket(AF_INET, SOCK_STREAM | SOCK_NONBLOCK, 0)) {
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    EXPECT_EQ(0, bind(_socket, reinterpret_cast<sockaddr*>(&address), length));
-    EXPECT_EQ(0, listen(_socket, 8));
-    EXPECT_EQ(0, getsockname(_socket, reinterpret_cast<sockaddr*>(&address), &length));
-    _port = ntohs(address.sin_port);
-  }
-  ~LoopbackListener() { close(_socket); }
-
-  int GetPort() const { return _port; }
-  bool WasConnected() const {
-    const int connection = accept(_socket, nullptr, nullptr);
-    if (connection < 0) return errno != EAGAIN && errno != EWOULDBLOCK;
-    close(connection);
-    return true;
-  }
-
- private:
-  int _socket;
-  int _port = 0;
-};
-
 TEST_F(GeneratedVectorTest, RemoteReferenceIsRefusedWithoutAnyConnection) {
-  LoopbackListener listener;
+  TestSupport::LoopbackListener listener;
   std::string token = TestSupport::ReadTestData("tokens/reference-uri-remote-http.xml");
   const std::string port = std::to_string(listener.GetPort());
   token.replace(token.find("@PORT@"), 6, port);
   ExpectVerdict(token, PARSE_ERROR,
                 "Signature syntax error: Reference URI \"http://127.0.0.1:" + port +
                     "/token\" is not accepted; expected \"\" or \"#id\"");
-  EXPECT_FALSE(listener.WasConnected());
+  EXPECT_EQ(0, listener.CountConnections());
 }
 
 // Every refusal reaches a handler for the common base class.

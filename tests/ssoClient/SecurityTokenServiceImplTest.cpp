@@ -29,12 +29,7 @@ using TestSupport::IssueTestToken;
 using TestSupport::LogCapture;
 using TestSupport::ScriptedTransport;
 
-boost::optional<HolderOfKeyConfig> ClientKeyMaterial() {
-  HolderOfKeyConfig config;
-  config.privateKey = TestSupport::LoadTestKeyPair("client").key;
-  config.certificate = TestSupport::LoadTestKeyPair("client").certificate;
-  return config;
-}
+using TestSupport::ClientKeyMaterial;
 
 TokenSpec Spec() {
   TokenSpec spec;

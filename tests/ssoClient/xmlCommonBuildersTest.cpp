@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include "ssoClient/BuiltTreeSupport.h"
 #include "ssoClient/XmlUtils.h"
 #include "support/TestTokens.h"
 #include "tamber/Exception.h"
@@ -10,22 +11,11 @@
 namespace SsoClient {
 namespace {
 
+using BuiltTree::Build;
+using BuiltTree::Serialize;
 using Tamber::Ref;
 using Tamber::Xml::ElementNode;
 using Tamber::Xml::Node;
-
-Ref<ElementNode> Build(const BuilderPtr& builder) {
-  Ref<ElementNode> element;
-  builder->build(element);
-  return element;
-}
-
-std::string Serialize(const ElementNode* element) {
-  Ref<Tamber::StringWriter> writer;
-  Tamber::CreateStringWriter(writer);
-  element->Serialize(writer.get());
-  return writer->GetString();
-}
 
 std::vector<Node*> Children(const Node* node) {
   std::vector<Node*> children;

@@ -4,6 +4,7 @@
 
 #include <gtest/gtest.h>
 
+#include "ssoClient/BuiltTreeSupport.h"
 #include "ssoClient/XmlUtils.h"
 #include "support/FixedClock.h"
 #include "support/TestTokens.h"
@@ -13,6 +14,10 @@
 namespace SsoClient {
 namespace {
 
+using BuiltTree::Build;
+using BuiltTree::ChildElements;
+using BuiltTree::ChildNames;
+using BuiltTree::Serialize;
 using Tamber::Ref;
 using Tamber::Xml::ElementNode;
 
@@ -23,33 +28,6 @@ const std::string WST = "http://docs.oasis-open.org/ws-sx/ws-trust/200512";
 const std::string PASSWORD_TEXT =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-username-token-profile-1.0#PasswordText";
 const char NOON[] = "2027-05-17T12:00:00.250Z";
-
-Ref<ElementNode> Build(const BuilderPtr& builder) {
-  Ref<ElementNode> element;
-  builder->build(element);
-  return element;
-}
-
-std::string Serialize(const ElementNode* element) {
-  Ref<Tamber::StringWriter> writer;
-  Tamber::CreateStringWriter(writer);
-  element->Serialize(writer.get());
-  return writer->GetString();
-}
-
-std::vector<ElementNode*> ChildElements(const ElementNode* element) {
-  std::vector<ElementNode*> children;
-  for (Tamber::Xml::Node* child = element->GetFirstChild(); child != nullptr; child = child->GetNextSibling()) {
-    if (child->GetKind() == Tamber::Xml::Node::ELEMENT) children.push_back(Tamber::DynamicCast<ElementNode>(child));
-  }
-  return children;
-}
-
-std::vector<std::string> ChildNames(const ElementNode* element) {
-  std::vector<std::string> names;
-  for (const ElementNode* child : ChildElements(element)) names.push_back(child->GetPrefix() + ":" + child->GetLocalName());
-  return names;
-}
 
 ElementNode* Child(const ElementNode* element, const std::string& localName) {
   ElementNode* child = element->FindChildElementByLocalName(localName);

@@ -5,6 +5,7 @@
 
 #include <gtest/gtest.h>
 
+#include "ssoClient/BuiltTreeSupport.h"
 #include "ssoClient/XmlUtils.h"
 #include "ssoClient/xmlRequestBuilders.h"
 #include "support/FixedClock.h"
@@ -17,6 +18,10 @@
 namespace SsoClient {
 namespace {
 
+using BuiltTree::Build;
+using BuiltTree::ChildElements;
+using BuiltTree::ChildNames;
+using BuiltTree::Serialize;
 using Tamber::Ref;
 using Tamber::Xml::ElementNode;
 using Tamber::Xml::QName;
@@ -33,33 +38,6 @@ const std::string BASE64_BINARY =
     "http://docs.oasis-open.org/wss/2004/01/oasis-200401-wss-soap-message-security-1.0#Base64Binary";
 const std::string EXC_C14N = "http://www.w3.org/2001/10/xml-exc-c14n#";
 const std::regex UUID_SUFFIX("(Body|Timestamp)[0-9a-f]{8}-[0-9a-f]{4}-[0-9a-f]{4}-[0-9a-f]{4}-[0-9a-f]{12}");
-
-Ref<ElementNode> Build(const BuilderPtr& builder) {
-  Ref<ElementNode> element;
-  builder->build(element);
-  return element;
-}
-
-std::string Serialize(const ElementNode* element) {
-  Ref<Tamber::StringWriter> writer;
-  Tamber::CreateStringWriter(writer);
-  element->Serialize(writer.get());
-  return writer->GetString();
-}
-
-std::vector<ElementNode*> ChildElements(const ElementNode* element) {
-  std::vector<ElementNode*> children;
-  for (Tamber::Xml::Node* child = element->GetFirstChild(); child != nullptr; child = child->GetNextSibling()) {
-    if (child->GetKind() == Tamber::Xml::Node::ELEMENT) children.push_back(Tamber::DynamicCast<ElementNode>(child));
-  }
-  return children;
-}
-
-std::vector<std::string> ChildNames(const ElementNode* element) {
-  std::vector<std::string> names;
-  for (const ElementNode* child : ChildElements(element)) names.push_back(child->GetPrefix() + ":" + child->GetLocalName());
-  return names;
-}
 
 ElementNode* Find(const ElementNode* element, const std::string& ns, const std::string& localName) {
   ElementNode* child = element == nullptr ? nullptr : element->FindChildElement(QName(ns, localName));

@@ -39,6 +39,13 @@ const TestKeyPair& LoadTestKeyPair(const std::string& name) {
   return found->second;
 }
 
+SsoClient::HolderOfKeyConfig ClientKeyMaterial() {
+  SsoClient::HolderOfKeyConfig config;
+  config.privateKey = LoadTestKeyPair("client").key;
+  config.certificate = LoadTestKeyPair("client").certificate;
+  return config;
+}
+
 SsoClient::CertificateList TrustedCertificates() { return {LoadTestCertificate("ca")}; }
 
 std::string IssueTestToken(const TokenIssuer::TokenRecord& record, const std::string& signer) {

@@ -7,6 +7,7 @@
 
 #include "TokenIssuer.h"
 #include "ssoClient/SamlToken.h"
+#include "ssoClient/TokenSpec.h"
 #include "tamber/Ref.h"
 #include "tamber/crypto/Certificate.h"
 #include "tamber/crypto/PrivateKey.h"
@@ -22,6 +23,9 @@ struct TestKeyPair {
 const TestKeyPair& LoadTestKeyPair(const std::string& name);
 // A certificate of tests/data/keys by name ("ca", "sts", ...).
 Tamber::Ref<const Tamber::Crypto::Certificate> LoadTestCertificate(const std::string& name);
+
+// The holder-of-key identity of the "client" test key, as a service is configured with it.
+SsoClient::HolderOfKeyConfig ClientKeyMaterial();
 
 // The whole of a file below tests/data, e.g. "tokens/valid-bearer.xml".
 std::string ReadTestData(const std::string& relativePath);

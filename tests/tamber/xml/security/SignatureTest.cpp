@@ -1,19 +1,14 @@
 #include "tamber/xml/security/Signature.h"
 
-#include <arpa/inet.h>
-#include <fcntl.h>
 #include <gtest/gtest.h>
-#include <netinet/in.h>
-#include <sys/socket.h>
-#include <unistd.h>
 
-#include <cerrno>
 #include <cstdio>
 #include <fstream>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "support/LoopbackListener.h"
 #include "tamber/StringUtil.h"
 #include "tamber/xml/LibXml.h"
 #include "tamber/xml/security/SignatureTestSupport.h"
@@ -87,40 +82,12 @@ struct Refused {
   std::string message;  // "PORT" stands for the port of the test's listening socket
 };
 
-// A listening socket on the loopback interface that counts the connections it receives.
-class Listener {
- public:
-  Listener() : _socket(socket(AF_INET, SOCK_STREAM | SOCK_NONBLOCK, 0)) {
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    socklen_t length = sizeof address;
-    EXPECT_EQ(0, bind(_socket, reinterpret_cast<sockaddr*>(&address), length));
-    EXPECT_EQ(0, listen(_socket, 4));
-    EXPECT_EQ(0, getsockname(_socket, reinterpret_cast<sockaddr*>(&address), &length));
-    _port = ntohs(address.sin_port);
-  }
-  ~Listener() { close(_socket); }
-
-  int GetPort() const { return _port; }
-  int CountConnections() const {
-    int count = 0;
-    for (int client; (client = accept(_socket, nullptr, nullptr)) >= 0; ++count) close(client);
-    EXPECT_TRUE(errno == EAGAIN || errno == EWOULDBLOCK);
-    return count;
-  }
-
- private:
-  int _socket;
-  int _port = 0;
-};
-
 class RefusedVectorTest : public testing::TestWithParam<Refused> {};
 
 TEST_P(RefusedVectorTest, IsRefusedForItsDefect) {
   const Refused& row = GetParam();
   SCOPED_TRACE(row.file);
-  Listener listener;
+  TestSupport::LoopbackListener listener;
   std::string port = std::to_string(listener.GetPort());
   SignedVector vector(Replace(Vector(row.file), "PORT", port));
   std::string expected = Replace(row.message, "PORT", port);
