@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <fstream>
 #include <functional>
+#include <ostream>
 
 #include <gtest/gtest.h>
 
@@ -123,6 +124,8 @@ struct PrefixListCase {
   std::function<void(TokenRecord&)> change;
   const char* prefixList;
 };
+
+std::ostream& operator<<(std::ostream& out, const PrefixListCase& row) { return out << row.label; }
 
 class InclusiveNamespacesTest : public TokenIssuerTest, public ::testing::WithParamInterface<PrefixListCase> {};
 

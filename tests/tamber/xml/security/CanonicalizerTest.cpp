@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <ostream>
 #include <string>
 
 #include "tamber/xml/XmlTestSupport.h"
@@ -43,6 +44,8 @@ struct Form {
   const char* algorithm;
   const char* expected;
 };
+
+std::ostream& operator<<(std::ostream& out, const Form& form) { return out << form.algorithm; }
 
 class SubtreeFormTest : public testing::TestWithParam<Form> {};
 
