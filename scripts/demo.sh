@@ -6,5 +6,5 @@ cd "$(dirname "$0")/.."
 bash scripts/install-deps.sh
 
 cmake -S . -B build -DCMAKE_BUILD_TYPE=RelWithDebInfo >/dev/null
-cmake --build build -j "$(nproc)" --target ssoclient-demo
-./build/tools/demo/ssoclient-demo "$@"
+cmake --build build -j "$(nproc)" --target ssoclient_cli
+./build/tools/cli/ssoclient demo "$@"

@@ -1,16 +1,14 @@
 // Runs the programs of examples/ as a user would, and keeps the README's copies of them honest.
 #include <sys/wait.h>
-#include <unistd.h>
 
 #include <cstdio>
-#include <cstdlib>
-#include <filesystem>
 #include <fstream>
 #include <sstream>
 #include <string>
 
 #include <gtest/gtest.h>
 
+#include "e2e/DevStsEnvironment.h"
 #include "support/TestTokens.h"
 
 namespace {
@@ -18,6 +16,7 @@ namespace {
 const std::string EXAMPLES_DIR = std::string(SSOCLIENT_BINARY_DIR) + "/examples/";
 const std::string SOURCE_DIR = std::string(SSOCLIENT_TEST_DATA_DIR) + "/../../";
 const std::string KEYS_DIR = std::string(SSOCLIENT_TEST_DATA_DIR) + "/keys/";
+const std::string SIGNATURE_REJECTED = "Failed to verify signature: token might have been tampered with.\n";
 
 std::string ReadFile(const std::string& path) {
   std::ifstream in(path, std::ios::binary);
@@ -27,35 +26,23 @@ std::string ReadFile(const std::string& path) {
   return content.str();
 }
 
+std::string WriteFile(const std::string& path, const std::string& content) {
+  std::ofstream(path, std::ios::binary) << content;
+  return path;
+}
+
+std::string Quote(const std::string& word) { return "'" + word + "'"; }
+
 struct Outcome {
   int exitCode;
   std::string out;
   std::string err;
 };
 
-// A scratch folder of the test's own, removed with it.
-class ScratchFolder {
- public:
-  ScratchFolder() {
-    std::string pattern = (std::filesystem::temp_directory_path() / "examples-XXXXXX").string();
-    if (mkdtemp(pattern.data()) == nullptr) throw std::runtime_error("mkdtemp failed");
-    _path = pattern;
-  }
-  ~ScratchFolder() { std::filesystem::remove_all(_path); }
-  std::string File(const std::string& name) const { return (_path / name).string(); }
-  std::string Write(const std::string& name, const std::string& content) const {
-    std::ofstream(File(name), std::ios::binary) << content;
-    return File(name);
-  }
-
- private:
-  std::filesystem::path _path;
-};
-
 // Runs a shell command line; its standard error goes through a file of `scratch`.
-Outcome Run(const ScratchFolder& scratch, const std::string& commandLine) {
-  const std::string errFile = scratch.File("stderr");
-  FILE* pipe = popen((commandLine + " 2>'" + errFile + "'").c_str(), "r");
+Outcome RunCommand(const E2e::TemporaryDirectory& scratch, const std::string& commandLine) {
+  const std::string errFile = scratch.GetPath() + "/stderr";
+  FILE* pipe = popen((commandLine + " 2>" + Quote(errFile)).c_str(), "r");
   if (pipe == nullptr) throw std::runtime_error("popen failed");
   std::string out;
   char buffer[4096];
@@ -64,14 +51,13 @@ Outcome Run(const ScratchFolder& scratch, const std::string& commandLine) {
   return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, out, ReadFile(errFile)};
 }
 
-std::string Quote(const std::string& word) { return "'" + word + "'"; }
+Outcome ValidateToken(const E2e::TemporaryDirectory& scratch, const std::string& token, const std::string& trustedPem) {
+  return RunCommand(scratch, Quote(EXAMPLES_DIR + "ValidateToken") + " " +
+                                 Quote(WriteFile(scratch.GetPath() + "/token.xml", token)) + " " + Quote(trustedPem));
+}
 
 class ValidateTokenExampleTest : public ::testing::Test {
  protected:
-  Outcome Validate(const std::string& token, const std::string& trustedPem) {
-    return Run(_scratch, Quote(EXAMPLES_DIR + "ValidateToken") + " " + Quote(_scratch.Write("token.xml", token)) +
-                             " " + Quote(trustedPem));
-  }
   // A token issued now, valid for an hour, signed by the test STS.
   static std::string FreshToken() {
     TokenIssuer::TokenRecord record;
@@ -79,13 +65,13 @@ class ValidateTokenExampleTest : public ::testing::Test {
     return TestSupport::IssueTestToken(record);
   }
 
-  ScratchFolder _scratch;
+  E2e::TemporaryDirectory _scratch;
 };
 
 TEST_F(ValidateTokenExampleTest, PrintsTheFactsOfATokenSignedByTheTrustedSigner) {
   for (const char* trusted : {"sts.pem", "ca.pem"}) {
     SCOPED_TRACE(trusted);
-    const Outcome outcome = Validate(FreshToken(), KEYS_DIR + trusted);
+    const Outcome outcome = ValidateToken(_scratch, FreshToken(), KEYS_DIR + trusted);
     EXPECT_EQ(0, outcome.exitCode) << outcome.err;
     EXPECT_EQ("", outcome.err);
     EXPECT_NE(std::string::npos, outcome.out.find("subject: {Name: alice; Domain:example.com}\n")) << outcome.out;
@@ -98,28 +84,66 @@ TEST_F(ValidateTokenExampleTest, PrintsTheFactsOfATokenSignedByTheTrustedSigner)
 }
 
 TEST_F(ValidateTokenExampleTest, RejectsAForeignSignerAndATamperedToken) {
-  const Outcome untrusted = Validate(FreshToken(), KEYS_DIR + "untrusted.pem");
+  const Outcome untrusted = ValidateToken(_scratch, FreshToken(), KEYS_DIR + "untrusted.pem");
   EXPECT_EQ(4, untrusted.exitCode);
-  EXPECT_EQ(0u, untrusted.err.rfind("token rejected: ", 0)) << untrusted.err;
+  EXPECT_EQ("token rejected: " + SIGNATURE_REJECTED, untrusted.err);
   EXPECT_EQ("", untrusted.out);
 
   std::string tampered = FreshToken();
   const size_t subject = tampered.find("alice@example.com");
   ASSERT_NE(std::string::npos, subject);
   tampered.replace(subject, 5, "mallo");
-  const Outcome edited = Validate(tampered, KEYS_DIR + "sts.pem");
+  const Outcome edited = ValidateToken(_scratch, tampered, KEYS_DIR + "sts.pem");
   EXPECT_EQ(4, edited.exitCode);
-  EXPECT_EQ(0u, edited.err.rfind("token rejected: ", 0)) << edited.err;
+  EXPECT_EQ("token rejected: " + SIGNATURE_REJECTED, edited.err);
 }
 
 TEST_F(ValidateTokenExampleTest, ExplainsUsageAndUnreadableFiles) {
-  const Outcome usage = Run(_scratch, Quote(EXAMPLES_DIR + "ValidateToken"));
+  const Outcome usage = RunCommand(_scratch, Quote(EXAMPLES_DIR + "ValidateToken"));
   EXPECT_EQ(2, usage.exitCode);
   EXPECT_EQ("usage: ValidateToken TOKEN_XML TRUSTED_CERTS_PEM\n", usage.err);
 
-  const Outcome missing = Validate(FreshToken(), _scratch.File("no-such.pem"));
-  EXPECT_EQ(1, missing.exitCode);
-  EXPECT_EQ("failed: cannot read " + _scratch.File("no-such.pem") + "\n", missing.err);
+  const std::string missing = _scratch.GetPath() + "/no-such.pem";
+  const Outcome unreadable = ValidateToken(_scratch, FreshToken(), missing);
+  EXPECT_EQ(1, unreadable.exitCode);
+  EXPECT_EQ("failed: cannot read " + missing + "\n", unreadable.err);
+}
+
+// The README's road end to end: AcquireToken against a development STS, then ValidateToken on
+// what it wrote.
+class AcquireTokenExampleTest : public E2e::DevStsTest {
+ protected:
+  Outcome AcquireToken(const std::string& password, const std::string& trustedTokenSigner) {
+    return RunCommand(_scratch, "echo " + Quote(password) + " | " + Quote(EXAMPLES_DIR + "AcquireToken") + " " +
+                                    Quote(environment->GetServer().GetUrl()) + " " +
+                                    Quote(environment->KeyFile(DevSts::CA_CERTIFICATE_FILE)) + " " +
+                                    Quote(trustedTokenSigner) + " alice@example.com");
+  }
+
+  E2e::TemporaryDirectory _scratch;
+};
+
+TEST_F(AcquireTokenExampleTest, AcquiresATokenThatValidateTokenAccepts) {
+  const std::string signer = environment->KeyFile(DevSts::SIGNING_CERTIFICATE_FILE);
+  const Outcome acquired = AcquireToken("alice-password", signer);
+  ASSERT_EQ(0, acquired.exitCode) << acquired.err;
+  EXPECT_EQ("", acquired.err);
+
+  const Outcome validated = ValidateToken(_scratch, acquired.out, signer);
+  EXPECT_EQ(0, validated.exitCode) << validated.err;
+  EXPECT_NE(std::string::npos, validated.out.find("subject: {Name: alice; Domain:example.com}\n")) << validated.out;
+}
+
+TEST_F(AcquireTokenExampleTest, TellsAWrongPasswordFromAnUntrustedSigner) {
+  const Outcome refused = AcquireToken("not-her-password", environment->KeyFile(DevSts::SIGNING_CERTIFICATE_FILE));
+  EXPECT_EQ(3, refused.exitCode);
+  EXPECT_EQ(0u, refused.err.rfind("wrong user name or password: ", 0)) << refused.err;
+  EXPECT_EQ("", refused.out);
+
+  const Outcome untrusted = AcquireToken("alice-password", KEYS_DIR + "untrusted.pem");
+  EXPECT_EQ(1, untrusted.exitCode);
+  EXPECT_EQ("failed: " + SIGNATURE_REJECTED, untrusted.err);
+  EXPECT_EQ("", untrusted.out);
 }
 
 // The README's quick start shows the example programs; a change to either must reach the other.

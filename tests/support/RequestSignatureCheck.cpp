@@ -11,16 +11,11 @@
 
 #include <libxml/parser.h>
 #include <libxml/tree.h>
-#include <libxml/valid.h>
-#include <xmlsec/app.h>
-#include <xmlsec/crypto.h>
-#include <xmlsec/xmldsig.h>
 #include <xmlsec/xmltree.h>
 
 #include "ssoClient/SamlConstants.h"
 #include "ssoClient/WireConstants.h"
 #include "tamber/StringUtil.h"
-#include "tamber/xml/security/XmlSec.h"
 
 namespace TestSupport {
 
@@ -28,31 +23,14 @@ namespace {
 
 namespace Wire = SsoClient::Wire;
 
-struct Deleter {
+struct DocumentDeleter {
   void operator()(xmlDoc* doc) const { xmlFreeDoc(doc); }
-  void operator()(xmlSecDSigCtx* context) const { xmlSecDSigCtxDestroy(context); }
 };
 
 const xmlChar* Chars(const char* text) { return reinterpret_cast<const xmlChar*>(text); }
 
 xmlNodePtr FindChild(xmlNodePtr parent, const char* localName, const char* ns) {
   return parent == nullptr ? nullptr : xmlSecFindChild(parent, Chars(localName), Chars(ns));
-}
-
-// The STS knows which attributes are IDs from the WS-Security schema; libxml2 has to be told.
-void RegisterWsuIds(xmlDocPtr doc, xmlNodePtr node) {
-  for (; node != nullptr; node = node->next) {
-    if (node->type != XML_ELEMENT_NODE) continue;
-    for (xmlAttrPtr attribute = node->properties; attribute != nullptr; attribute = attribute->next) {
-      if (attribute->ns != nullptr && xmlStrEqual(attribute->ns->href, Chars(Wire::kWsu.uri)) &&
-          xmlStrEqual(attribute->name, Chars("Id"))) {
-        xmlChar* value = xmlNodeListGetString(doc, attribute->children, 1);
-        xmlAddID(nullptr, doc, value, attribute);
-        xmlFree(value);
-      }
-    }
-    RegisterWsuIds(doc, node->children);
-  }
 }
 
 std::string ToPem(const Tamber::Crypto::Certificate& certificate) {
@@ -76,15 +54,17 @@ std::string WriteTemporaryFile(const std::string& content) {
 
 RequestSignatureResult VerifyRequestSignature(const std::string& requestXml,
                                               const Tamber::Crypto::Certificate& certificate) {
-  Tamber::Xml::Security::EnsureXmlSecInitialized();
   RequestSignatureResult result;
-  std::unique_ptr<xmlDoc, Deleter> doc(
+  std::unique_ptr<xmlDoc, DocumentDeleter> doc(
       xmlReadMemory(requestXml.data(), static_cast<int>(requestXml.size()), nullptr, nullptr, XML_PARSE_NONET));
   if (!doc) {
     result.error = "the request is not well-formed XML";
     return result;
   }
-  RegisterWsuIds(doc.get(), xmlDocGetRootElement(doc.get()));
+  if (!DevSts::RegisterWsuIds(doc.get())) {
+    result.error = "a wsu:Id value is used twice";
+    return result;
+  }
   xmlNodePtr header = FindChild(xmlDocGetRootElement(doc.get()), "Header", Wire::kSoapEnvelope.uri);
   xmlNodePtr security = FindChild(header, "Security", Wire::kWsse.uri);
   xmlNodePtr signature = FindChild(security, "Signature", SsoClient::Saml::DSIG_NS);
@@ -92,26 +72,7 @@ RequestSignatureResult VerifyRequestSignature(const std::string& requestXml,
     result.error = "no ds:Signature in soapenv:Header/wsse:Security";
     return result;
   }
-  std::unique_ptr<xmlSecDSigCtx, Deleter> context(xmlSecDSigCtxCreate(nullptr));
-  context->enabledReferenceUris = xmlSecTransformUriTypeSameDocument;
-  const std::vector<unsigned char>& der = certificate.GetDer();
-  context->signKey = xmlSecCryptoAppKeyLoadMemory(der.data(), static_cast<xmlSecSize>(der.size()),
-                                                  xmlSecKeyDataFormatCertDer, nullptr, nullptr, nullptr);
-  if (context->signKey == nullptr) {
-    result.error = "the certificate could not be loaded";
-    return result;
-  }
-  if (xmlSecDSigCtxVerify(context.get(), signature) < 0) {
-    result.error = "xmlsec could not carry out the verification";
-    return result;
-  }
-  for (xmlSecSize i = 0; i < xmlSecPtrListGetSize(&context->signedInfoReferences); ++i) {
-    auto* reference = static_cast<xmlSecDSigReferenceCtx*>(xmlSecPtrListGetItem(&context->signedInfoReferences, i));
-    result.referenceUris.push_back(reference->uri == nullptr ? "" : reinterpret_cast<const char*>(reference->uri));
-    result.referenceValid.push_back(reference->status == xmlSecDSigStatusSucceeded);
-  }
-  result.valid = context->status == xmlSecDSigStatusSucceeded;
-  return result;
+  return DevSts::VerifySignatureElement(signature, certificate.GetDer());
 }
 
 std::string AlterFirstTextByteOf(const std::string& requestXml, const std::string& qualifiedName) {

@@ -8,19 +8,14 @@
 #include <string>
 #include <vector>
 
+#include "RequestSignature.h"
 #include "tamber/crypto/Certificate.h"
 
 namespace TestSupport {
 
-struct RequestSignatureResult {
-  // Cryptographically valid: every reference digest and the signature value match.
-  bool valid = false;
-  // The URIs of the ds:Reference elements, in order, with whether each digest matched.
-  std::vector<std::string> referenceUris;
-  std::vector<bool> referenceValid;
-  // Set when verification could not be carried out at all (parse error, no signature, ...).
-  std::string error;
-};
+// Whether the signature verified, its reference URIs in order with their digest outcome, and an
+// error when verification could not be carried out at all (parse error, no signature, ...).
+using RequestSignatureResult = DevSts::SignatureCheck;
 
 // Verifies the ds:Signature that is a direct child of soapenv:Header/wsse:Security with the
 // public key of `certificate` (the key information of the request is not consulted: the caller

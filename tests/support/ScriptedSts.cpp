@@ -5,9 +5,7 @@
 #include <gtest/gtest.h>
 
 #include "ssoClient/Exceptions.h"
-#include "ssoClient/WireConstants.h"
 #include "tamber/Stream.h"
-#include "tamber/StringUtil.h"
 
 namespace TestSupport {
 
@@ -50,7 +48,7 @@ struct ScriptedTransport::Script {
 
 namespace {
 
-class ScriptedSession : public SsoClient::TransportSession {
+class ScriptedSession final : public SsoClient::TransportSession {
  public:
   ScriptedSession(const std::shared_ptr<ScriptedTransport::Script>& script, size_t index)
       : _script(script), _index(index) {}
@@ -76,24 +74,6 @@ class ScriptedSession : public SsoClient::TransportSession {
   std::shared_ptr<ScriptedTransport::Script> _script;
   size_t _index;
 };
-
-const std::string WST = SsoClient::Wire::kWsTrust.uri;
-
-std::string Envelope(const std::string& body) {
-  return std::string("<soapenv:Envelope xmlns:soapenv=\"") + SsoClient::Wire::kSoapEnvelope.uri +
-         "\"><soapenv:Body>" + body + "</soapenv:Body></soapenv:Envelope>";
-}
-
-std::string RequestedToken(const std::string& assertion) {
-  return "<wst:RequestedSecurityToken>" + assertion + "</wst:RequestedSecurityToken>";
-}
-
-std::string TokenType() { return std::string("<wst:TokenType>") + SsoClient::Wire::kTokenTypeSaml20 + "</wst:TokenType>"; }
-
-std::string BinaryExchange(const SsoClient::Leg& leg) {
-  return std::string("<wst:BinaryExchange ValueType=\"") + SsoClient::Wire::kSpnegoValueType + "\" EncodingType=\"" +
-         SsoClient::Wire::kBase64Binary + "\">" + Tamber::StringUtil::Base64Encode(leg) + "</wst:BinaryExchange>";
-}
 
 }  // namespace
 
@@ -140,41 +120,6 @@ size_t ScriptedTransport::GetSessionCount() const {
 boost::shared_ptr<SsoClient::TransportSession> ScriptedTransport::CreateSession() const {
   std::lock_guard<std::mutex> lock(_script->mutex);
   return boost::shared_ptr<SsoClient::TransportSession>(new ScriptedSession(_script, _script->sessions++));
-}
-
-std::string IssueAnswer(const std::string& assertion) {
-  return Envelope("<wst:RequestSecurityTokenResponseCollection xmlns:wst=\"" + WST +
-                  "\"><wst:RequestSecurityTokenResponse>" + TokenType() + RequestedToken(assertion) +
-                  "</wst:RequestSecurityTokenResponse></wst:RequestSecurityTokenResponseCollection>");
-}
-
-std::string RenewAnswer(const std::string& assertion) {
-  return Envelope("<wst:RequestSecurityTokenResponse xmlns:wst=\"" + WST + "\">" + TokenType() +
-                  RequestedToken(assertion) + "</wst:RequestSecurityTokenResponse>");
-}
-
-std::string ValidateAnswer(bool valid) {
-  return Envelope("<wst:RequestSecurityTokenResponse xmlns:wst=\"" + WST + "\"><wst:TokenType>" +
-                  SsoClient::Wire::kTokenTypeStatus + "</wst:TokenType><wst:Status><wst:Code>" + WST +
-                  (valid ? "/status/valid" : "/status/invalid") +
-                  "</wst:Code></wst:Status></wst:RequestSecurityTokenResponse>");
-}
-
-std::string SPNegoLegAnswer(const std::string& contextId, const SsoClient::Leg& leg) {
-  return Envelope("<wst:RequestSecurityTokenResponse xmlns:wst=\"" + WST + "\" Context=\"" + contextId + "\">" +
-                  BinaryExchange(leg) + "</wst:RequestSecurityTokenResponse>");
-}
-
-std::string SPNegoFinalAnswer(const std::string& contextId, const SsoClient::Leg& leg, const std::string& assertion) {
-  return Envelope("<wst:RequestSecurityTokenResponseCollection xmlns:wst=\"" + WST +
-                  "\"><wst:RequestSecurityTokenResponse Context=\"" + contextId + "\">" + TokenType() +
-                  (leg.empty() ? std::string() : BinaryExchange(leg)) + RequestedToken(assertion) +
-                  "</wst:RequestSecurityTokenResponse></wst:RequestSecurityTokenResponseCollection>");
-}
-
-std::string FaultAnswer(const std::string& faultcode, const std::string& faultstring) {
-  return Envelope("<soapenv:Fault xmlns:wst=\"" + WST + "\"><faultcode>" + faultcode +
-                  "</faultcode><faultstring>" + faultstring + "</faultstring></soapenv:Fault>");
 }
 
 std::vector<std::string> FramedMessages(const std::vector<std::string>& messages, const std::string& operation) {

@@ -16,6 +16,7 @@
 
 #include <boost/shared_ptr.hpp>
 
+#include "StsAnswers.h"
 #include "ssoClient/HttpsClient.h"
 #include "ssoClient/NegotiationHandler.h"
 #include "ssoClient/Request.h"
@@ -33,7 +34,7 @@ struct RecordedRequest {
 // Answers each request with the next queued answer, or else with the standing answer for its
 // SOAP action, or else with a CommunicationException saying that nothing was scripted. Records
 // every request. Safe for concurrent sessions.
-class ScriptedTransport : public SsoClient::Transport {
+class ScriptedTransport final : public SsoClient::Transport {
  public:
   ScriptedTransport();
 
@@ -59,16 +60,13 @@ class ScriptedTransport : public SsoClient::Transport {
   std::shared_ptr<Script> _script;
 };
 
-// The WS-Trust answers of an STS, in SOAP 1.1 envelopes.
-std::string IssueAnswer(const std::string& assertion);
-std::string RenewAnswer(const std::string& assertion);
-std::string ValidateAnswer(bool valid);
-// An intermediate SPNEGO answer: a bare response with the context id and the STS's leg.
-std::string SPNegoLegAnswer(const std::string& contextId, const SsoClient::Leg& leg);
-// The final SPNEGO answer: a collection with the context id, the leg when not empty, and the token.
-std::string SPNegoFinalAnswer(const std::string& contextId, const SsoClient::Leg& leg, const std::string& assertion);
-// A SOAP fault; `faultcode` may use the prefix "wst", which the answer binds to WS-Trust 1.3.
-std::string FaultAnswer(const std::string& faultcode, const std::string& faultstring);
+// The WS-Trust answers of an STS, in SOAP 1.1 envelopes: those of the development STS.
+using DevSts::FaultAnswer;
+using DevSts::IssueAnswer;
+using DevSts::RenewAnswer;
+using DevSts::SPNegoFinalAnswer;
+using DevSts::SPNegoLegAnswer;
+using DevSts::ValidateAnswer;
 
 // The messages logged between the START and END messages of one operation of the service; adds a
 // test failure unless `messages` begins with START and ends with END of `operation` under one

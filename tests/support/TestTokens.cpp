@@ -39,7 +39,7 @@ const TestKeyPair& LoadTestKeyPair(const std::string& name) {
   return found->second;
 }
 
-SsoClient::HolderOfKeyConfig ClientKeyMaterial() {
+boost::optional<SsoClient::HolderOfKeyConfig> ClientKeyMaterial() {
   SsoClient::HolderOfKeyConfig config;
   config.privateKey = LoadTestKeyPair("client").key;
   config.certificate = LoadTestKeyPair("client").certificate;

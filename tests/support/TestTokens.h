@@ -5,6 +5,8 @@
 
 #include <string>
 
+#include <boost/optional.hpp>
+
 #include "TokenIssuer.h"
 #include "ssoClient/SamlToken.h"
 #include "ssoClient/TokenSpec.h"
@@ -25,7 +27,7 @@ const TestKeyPair& LoadTestKeyPair(const std::string& name);
 Tamber::Ref<const Tamber::Crypto::Certificate> LoadTestCertificate(const std::string& name);
 
 // The holder-of-key identity of the "client" test key, as a service is configured with it.
-SsoClient::HolderOfKeyConfig ClientKeyMaterial();
+boost::optional<SsoClient::HolderOfKeyConfig> ClientKeyMaterial();
 
 // The whole of a file below tests/data, e.g. "tokens/valid-bearer.xml".
 std::string ReadTestData(const std::string& relativePath);

@@ -10,9 +10,10 @@ namespace SsoClient {
 
 // The identity of a user, solution or group: a name within a domain. Both parts are non-empty.
 struct SSOCLIENT_API PrincipalId {
-  std::string name;
-  std::string domain;
+  std::string name;    // "alice" of alice@example.com
+  std::string domain;  // "example.com"
 
+  // Both parts must be non-empty (asserted in debug builds).
   PrincipalId(const std::string& name, const std::string& domain) : name(name), domain(domain) {
     assert(!name.empty());
     assert(!domain.empty());

@@ -39,6 +39,8 @@ struct SSOCLIENT_API Advice {
 // boost::shared_ptr<const SamlToken> and may be read from any number of threads at once.
 class SSOCLIENT_API SamlToken {
  public:
+  // How the presenter proves it may use the token: by merely holding it (bearer), or by proving
+  // possession of the key of GetConfirmationCertificate() (holder-of-key).
   enum ConfirmationType {
     CONFIRM_BEARER = 0,
     CONFIRM_HOLDER_OF_KEY = 1,
@@ -51,10 +53,13 @@ class SSOCLIENT_API SamlToken {
   virtual const Tamber::System::DateTime& GetEndDate() const = 0;
   // The subject, from its UPN name identifier.
   virtual const PrincipalId& GetSubject() const = 0;
+  // True when the token carries a renew restriction with a count above zero.
   virtual bool IsRenewable() const = 0;
+  // True when the token carries a proxy restriction with a count above zero.
   virtual bool IsDelegable() const = 0;
   // True when the subject is a solution (a service account) rather than a person.
   virtual bool IsSolution() const = 0;
+  // Bearer or holder-of-key.
   virtual ConfirmationType GetConfirmationMethod() const = 0;
   // (given name, surname); each empty when the token carries none.
   virtual void GetFullName(std::pair<std::string, std::string>& fullName) const = 0;
@@ -76,6 +81,8 @@ class SSOCLIENT_API SamlToken {
   ~SamlToken() = default;
 };
 
+// Trusted token signers: each certificate is accepted as the signer itself or as a CA the
+// signer's certificate chains to.
 using CertificateList = std::list<Tamber::Ref<const Tamber::Crypto::Certificate>>;
 
 // Parses and validates an assertion against the STS's signing certificates, allowing
@@ -91,10 +98,12 @@ SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(const std::stri
 // The same against one certificate.
 SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlToken(const std::string& xml,
                                                                  const Tamber::Crypto::Certificate* certificate);
-// From an element of a parsed document; ToXml() then gives its canonical form.
+// From an element of a parsed document, which the caller keeps owning; ToXml() then gives its
+// canonical form. Raises ParseException or InvalidSignatureException.
 SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlTokenFromDom(Tamber::Xml::ElementNode* element,
                                                                         const CertificateList& certificates,
                                                                         long long clockToleranceSec);
+// The same with a tolerance of 600 seconds.
 SSOCLIENT_API boost::shared_ptr<const SamlToken> CreateSamlTokenFromDom(Tamber::Xml::ElementNode* element,
                                                                         const CertificateList& certificates);
 

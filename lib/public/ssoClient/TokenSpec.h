@@ -50,6 +50,7 @@ struct SSOCLIENT_API TokenSpec {
   boost::optional<std::string> delegateTo;
   // The token may be renewed.
   bool renewable = false;
+  // Bearer, or the default that follows the service's key material.
   Confirmation confirmation = CONFIRMATION_DEFAULT;
 };
 

@@ -13,9 +13,11 @@ namespace Tamber {
 // Root of the layer's exceptions: a UTF-8 message and the call stack where it was raised.
 class TAMBER_API Throwable : public std::exception {
  public:
+  // Captures the call stack; `message` is UTF-8 text saying what was expected and found.
   explicit Throwable(const std::string& message);
   ~Throwable() override;
 
+  // The message given at construction.
   const char* what() const noexcept override;
   // The call stack at construction, one frame per line, symbolised on demand.
   std::string GetBacktrace() const;
@@ -34,7 +36,9 @@ class TAMBER_API Throwable : public std::exception {
 class TAMBER_API Exception : public Throwable {
  public:
   explicit Exception(const std::string& message);
+  // A heap copy of the same dynamic type; the caller owns it.
   virtual Exception* Clone() const;
+  // Throws a copy of this exception as its own dynamic type.
   [[noreturn]] virtual void Throw() const;
 };
 
@@ -76,6 +80,7 @@ template <class To, class From>
 To* DynamicCast(From* object);
 
 namespace Detail {
+// Raises TypeMismatchException naming both types; DynamicCast's failure path.
 [[noreturn]] TAMBER_API void ThrowTypeMismatch(const char* expected, const char* found);
 }
 

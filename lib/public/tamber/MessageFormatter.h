@@ -15,6 +15,8 @@ namespace MessageFormatter {
 // pointer never turns into a Boolean by accident.
 class TAMBER_API PrintFormatter {
  public:
+  // Text as it stands (a null C string as empty text), integers in decimal; Booleans only
+  // through BoolPrintFormatter.
   PrintFormatter(const std::string& text) : _text(text) {}
   PrintFormatter(const char* text) : _text(text ? text : "") {}
   PrintFormatter(int value) : _text(std::to_string(value)) {}
@@ -25,6 +27,7 @@ class TAMBER_API PrintFormatter {
   PrintFormatter(unsigned long long value) : _text(std::to_string(value)) {}
   PrintFormatter(bool) = delete;
 
+  // The argument's text as it goes into the message.
   const std::string& GetText() const { return _text; }
 
  protected:
@@ -54,6 +57,7 @@ class TAMBER_API DatePrintFormatter : public PrintFormatter {
 TAMBER_API std::string ASPrintArray(const char* format, const PrintFormatter* const* arguments,
                                     size_t count);
 
+// ASPrintArray over the arguments, each converted to a PrintFormatter.
 template <class... Arguments>
 std::string ASPrint(const char* format, const Arguments&... arguments) {
   const PrintFormatter converted[] = {PrintFormatter(arguments)..., PrintFormatter("")};

@@ -18,6 +18,7 @@ namespace Tamber {
 // The same with the expression text given explicitly, for messages that must read a fixed way.
 #define TAMBER_VERIFY_TEXT(condition, text) \
   ((condition) ? static_cast<void>(0) : ::Tamber::PanicVerify(text, __FILE__, __LINE__))
+// Marks a branch that no input may reach; reaching it ends the process naming the location.
 #define TAMBER_NOT_REACHED() ::Tamber::PanicNotReached(__FILE__, __LINE__)
 
 #endif

@@ -18,7 +18,9 @@ class TAMBER_API Object {
   Object(const Object&) = delete;
   Object& operator=(const Object&) = delete;
 
+  // Counts one more reference; safe from any thread.
   virtual void AddRef() const;
+  // Counts one reference less and deletes the object when none is left.
   virtual void Release() const;
 
  protected:
@@ -80,6 +82,7 @@ class Ref {
   T* _p;
 };
 
+// Refs compare by the object they point to.
 template <class T, class U>
 bool operator==(const Ref<T>& a, const Ref<U>& b) {
   return a.get() == b.get();

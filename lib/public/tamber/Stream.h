@@ -19,6 +19,7 @@ class TAMBER_API Reader : public Object {
 // A sink of bytes.
 class TAMBER_API Writer : public Object {
  public:
+  // Appends `size` bytes of `data`.
   virtual void Write(const char* data, size_t size) = 0;
   void Write(const std::string& text) { Write(text.data(), text.size()); }
 };
@@ -27,6 +28,7 @@ class TAMBER_API Writer : public Object {
 class TAMBER_API StringWriter : public Writer {
  public:
   using Writer::Write;
+  // Everything written so far.
   virtual const std::string& GetString() const = 0;
 };
 

@@ -70,6 +70,12 @@ void UserAgentImpl::Configure() {
   TAMBER_CURL_SET(easy, CURLOPT_SSL_VERIFYPEER, !pinned && ssl->GetSSLContext().VerifiesPeer() ? 1L : 0L);
   TAMBER_CURL_SET(easy, CURLOPT_SSL_VERIFYHOST, !pinned && ssl->GetSSLContext().VerifiesHostName() ? 2L : 0L);
   TAMBER_CURL_SET(easy, CURLOPT_SSL_CTX_FUNCTION, &Transfer::OnSslContext);
+  if (pinned || !ssl->GetSSLContext().GetTrustedCertificates().empty()) {
+    // The handshake then trusts only the pin or the context's own anchors; libcurl would still
+    // parse the whole system CA bundle for every connection (about 15 ms) before replacing it.
+    TAMBER_CURL_SET(easy, CURLOPT_CAINFO, static_cast<const char*>(nullptr));
+    TAMBER_CURL_SET(easy, CURLOPT_CAPATH, static_cast<const char*>(nullptr));
+  }
   const TcpConnectionSpec& tcp = ssl->GetTcp();
   if (tcp.GetHost() != ssl->GetHost()) {
     // The URL names the host to prove; the TCP connection goes where the TCP description says.

@@ -99,12 +99,12 @@ TEST(ParseThumbprintPin, ReadsHexInAnyCaseWithOrWithoutColons) {
 class ParseThumbprintPinRefuses : public testing::TestWithParam<std::string> {};
 
 TEST_P(ParseThumbprintPinRefuses, WithInvalidArgumentQuotingIt) {
-  SCOPED_TRACE(GetParam());
+  const std::string pin = GetParam();
   EXPECT_EQ(
       "Invalid argument : The SSL parameter must be empty or the SHA-256 thumbprint of the server certificate (64 "
       "hexadecimal digits, optionally with a colon between each pair); found \"" +
-          GetParam() + "\"",
-      InvalidArgumentMessage([this] { ParseThumbprintPin(GetParam()); }));
+          pin + "\"",
+      InvalidArgumentMessage([&pin] { ParseThumbprintPin(pin); }));
 }
 
 INSTANTIATE_TEST_SUITE_P(

@@ -23,6 +23,7 @@ class TAMBER_API Certificate : public Object {
   // Distinguished names in RFC 2253 form ("CN=sts,O=Example").
   virtual std::string GetSubjectName() const = 0;
   virtual std::string GetIssuerName() const = 0;
+  // The validity period the certificate states.
   virtual System::DateTime GetNotBefore() const = 0;
   virtual System::DateTime GetNotAfter() const = 0;
   // SHA-256 of the DER encoding, as lower-case hex without separators.

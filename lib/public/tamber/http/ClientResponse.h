@@ -13,6 +13,7 @@ namespace Http {
 // while they are received).
 class TAMBER_API ClientResponse : public Reader {
  public:
+  // The HTTP status code, e.g. 200 or 500.
   virtual int GetStatusCode() const = 0;
   // The reason phrase of the status line as the server sent it, cut to 256 bytes, with every
   // byte that is not printable ASCII, space or tab replaced by '?', since it is untrusted text

@@ -15,7 +15,9 @@ class TAMBER_API ConnectionSpec : public Object {
   // The host name requests are addressed to (for TLS: the name the certificate must carry);
   // an IPv6 address without brackets.
   virtual const std::string& GetHost() const = 0;
+  // The TCP port connected to.
   virtual int GetPort() const = 0;
+  // True for TLS over TCP.
   virtual bool IsSecure() const = 0;
 };
 

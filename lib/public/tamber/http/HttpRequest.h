@@ -9,6 +9,7 @@
 namespace Tamber {
 namespace Http {
 
+// The request methods the layer speaks.
 enum HttpMethod {
   HTTP_GET = 1,
   HTTP_HEAD = 2,
@@ -23,6 +24,7 @@ enum HttpMethod {
 class TAMBER_API HttpRequest : public Object {
  public:
   virtual HttpMethod GetMethod() const = 0;
+  // The target as given at creation, query included.
   virtual const std::string& GetPath() const = 0;
 
   // Adds the header line "name: value". The name must be an HTTP token and the value must not

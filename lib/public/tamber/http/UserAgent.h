@@ -19,6 +19,7 @@ namespace Http {
 // A request handed to a user agent, until its response or failure is known.
 class TAMBER_API PendingRequestItem : public System::ScheduledItem {
  public:
+  // The request as handed to the agent, now read-only.
   virtual HttpRequest* GetRequest() const = 0;
 };
 
@@ -48,6 +49,7 @@ class ConnectionPool;
 // arrive, TLS 1.2 at least.
 class TAMBER_API UserAgent : public Object {
  public:
+  // The server this agent talks to; owned by the agent.
   virtual ConnectionSpec* GetConnectionSpec() const = 0;
 
   // Queues `request` and returns at once; `completion` runs when the outcome is known. `item`

@@ -30,6 +30,7 @@ class LogManager;
 class TAMBER_API Logger : public Object {
  public:
   const std::string& GetName() const { return _name; }
+  // The most detailed level emitted now: messages of a higher number are dropped.
   int GetLevel() const { return _level.load(std::memory_order_relaxed); }
   void SetLevel(int level) { _level.store(level, std::memory_order_relaxed); }
   // The level of the component's most detailed tracing, given when the logger was first asked
@@ -40,6 +41,7 @@ class TAMBER_API Logger : public Object {
   // Hands the message to the manager's sink when the level allows it.
   void Emit(int level, const std::string& message) const;
 
+  // Made by the log manager only; ask it for loggers with GetLogger.
   Logger(const LogManager* manager, const std::string& name, int level, int traceLevel);
 
  private:
@@ -70,12 +72,14 @@ class TAMBER_API LogManager : public Object {
 // The process-wide application object.
 class TAMBER_API App {
  public:
+  // The log manager of the process; lives as long as the process.
   virtual LogManager* GetLogManager() = 0;
 
  protected:
   ~App() = default;
 };
 
+// The application object, created on first use and never destroyed; safe from any thread.
 TAMBER_API App* GetApp();
 
 // Formats and emits one message when the logger's level is at least `level`. Callers that pass

@@ -43,6 +43,7 @@ class TAMBER_API DateTime {
   int GetMillisecond() const;
   int GetMicrosecond() const;  // 0..999999, the whole sub-second part
 
+  // Instants compare by their microseconds since the epoch.
   bool operator==(const DateTime& other) const { return _utcMicros == other._utcMicros; }
   bool operator!=(const DateTime& other) const { return _utcMicros != other._utcMicros; }
   bool operator<(const DateTime& other) const { return _utcMicros < other._utcMicros; }

@@ -37,7 +37,9 @@ class TAMBER_API Node : public Object {
     OTHER = 7,
   };
 
+  // One of Kind.
   virtual int GetKind() const = 0;
+  // Navigation; null where there is no such node. The tree owns the nodes returned.
   virtual Node* GetFirstChild() const = 0;
   virtual Node* GetNextSibling() const = 0;
   virtual Node* GetParent() const = 0;
@@ -51,6 +53,7 @@ class TAMBER_API Node : public Object {
 // A text node (kind 1). CDATA sections are nodes of their own kind.
 class TAMBER_API TextNode : public Node {
  public:
+  // The text (UTF-8).
   virtual std::string GetText() const = 0;
   virtual void SetText(const std::string& text) = 0;
 };
@@ -63,6 +66,7 @@ class TAMBER_API TextNode : public Node {
 // later, and they never count as plain attributes. A prefix still unbound has no namespace.
 class TAMBER_API ElementNode : public Node {
  public:
+  // The name as written: "Assertion" and "saml2" for <saml2:Assertion>.
   virtual std::string GetLocalName() const = 0;
   virtual std::string GetPrefix() const = 0;
   // The namespace bound to the element's own prefix in scope; empty when unbound.
@@ -99,6 +103,7 @@ class TAMBER_API ElementNode : public Node {
 // A document: the owner of a tree.
 class TAMBER_API Document : public Node {
  public:
+  // The document element, or null when there is none.
   virtual ElementNode* GetRootElement() const = 0;
   // Detaches `child` (the root element, typically) from the document. The detached subtree gets
   // a document of its own, so Refs to it stay valid and it can be appended elsewhere.

@@ -14,6 +14,7 @@ namespace Security {
 // Writes the canonical form of an element's subtree.
 class TAMBER_API Canonicalizer : public Object {
  public:
+  // Writes the canonical form of `element` and its subtree to `writer`.
   virtual void Canonicalize(const ElementNode* element, Writer* writer) const = 0;
 };
 

@@ -34,6 +34,7 @@ TAMBER_API void CreateTrustChainKeyResolver(const std::list<Ref<const Crypto::Ce
 // One ds:Reference of a signature.
 class TAMBER_API Reference : public Object {
  public:
+  // The URI as written ("" or "#id").
   virtual const std::string& GetURI() const = 0;
   // Adds a transform (by algorithm URI) to a reference of a signature being built.
   virtual void AddTransform(const std::string& algorithmUri) = 0;
@@ -42,6 +43,7 @@ class TAMBER_API Reference : public Object {
 // An XML signature: read from a document to be verified, or built blank and then signed.
 class TAMBER_API Signature : public Object {
  public:
+  // The signature's references in document order.
   virtual const std::vector<Ref<Reference>>& GetReferences() const = 0;
 
   // Verifies the signature and every reference. True when valid; false when the cryptography

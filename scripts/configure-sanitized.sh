@@ -1,0 +1,9 @@
+#!/usr/bin/env bash
+# Configures build-asan: clang with AddressSanitizer and UndefinedBehaviorSanitizer on every
+# target, plus libFuzzer's coverage instrumentation so that the same tree builds the unit tests
+# and the fuzz targets. Used by test.sh and fuzz.sh.
+set -euo pipefail
+cd "$(dirname "$0")/.."
+
+CC=clang CXX=clang++ cmake -S . -B build-asan -DCMAKE_BUILD_TYPE=Debug \
+  -DSSOCLIENT_SANITIZE=ON -DSSOCLIENT_BUILD_FUZZ=ON >/dev/null
