@@ -1,6 +1,7 @@
 #include "tamber/xml/LibXml.h"
 
 #include <mutex>
+#include <typeinfo>
 
 #include <libxml/parser.h>
 
@@ -90,6 +91,12 @@ void ScopedXmlErrorCapture::OnError(void* capture, xmlErrorPtr error) {
 // --- Wrappers ----------------------------------------------------------------------------------
 
 xmlNodePtr ToXmlNode(const Node* node) {
+  if (node == nullptr) return nullptr;
+  // The exact wrapper classes first: a cross cast to Wrapper searches the whole hierarchy, and
+  // building a request converts nodes hundreds of times.
+  const std::type_info& type = typeid(*node);
+  if (type == typeid(ElementNodeImpl)) return static_cast<const ElementNodeImpl*>(node)->GetXmlNodePtr();
+  if (type == typeid(TextNodeImpl)) return static_cast<const TextNodeImpl*>(node)->GetXmlNodePtr();
   const auto* wrapper = dynamic_cast<const Wrapper*>(node);
   return wrapper != nullptr ? wrapper->GetXmlNodePtr() : nullptr;
 }

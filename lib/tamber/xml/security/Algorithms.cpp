@@ -15,13 +15,29 @@ std::vector<xmlSecTransformId> Canonicalizations() {
 }
 
 std::vector<SignatureMethod> SignatureMethods() {
-  return {{xmlSecOpenSSLTransformRsaSha256Id, EVP_PKEY_RSA},   {xmlSecOpenSSLTransformRsaSha384Id, EVP_PKEY_RSA},
-          {xmlSecOpenSSLTransformRsaSha512Id, EVP_PKEY_RSA},   {xmlSecOpenSSLTransformEcdsaSha256Id, EVP_PKEY_EC},
-          {xmlSecOpenSSLTransformEcdsaSha384Id, EVP_PKEY_EC}, {xmlSecOpenSSLTransformEcdsaSha512Id, EVP_PKEY_EC}};
+  return {{xmlSecOpenSSLTransformRsaSha256Id, EVP_PKEY_RSA, EVP_sha256()},
+          {xmlSecOpenSSLTransformRsaSha384Id, EVP_PKEY_RSA, EVP_sha384()},
+          {xmlSecOpenSSLTransformRsaSha512Id, EVP_PKEY_RSA, EVP_sha512()},
+          {xmlSecOpenSSLTransformEcdsaSha256Id, EVP_PKEY_EC, EVP_sha256()},
+          {xmlSecOpenSSLTransformEcdsaSha384Id, EVP_PKEY_EC, EVP_sha384()},
+          {xmlSecOpenSSLTransformEcdsaSha512Id, EVP_PKEY_EC, EVP_sha512()}};
+}
+
+struct Digest {
+  xmlSecTransformId transform;
+  const EVP_MD* hash;
+};
+
+std::vector<Digest> DigestTable() {
+  return {{xmlSecOpenSSLTransformSha256Id, EVP_sha256()},
+          {xmlSecOpenSSLTransformSha384Id, EVP_sha384()},
+          {xmlSecOpenSSLTransformSha512Id, EVP_sha512()}};
 }
 
 std::vector<xmlSecTransformId> Digests() {
-  return {xmlSecOpenSSLTransformSha256Id, xmlSecOpenSSLTransformSha384Id, xmlSecOpenSSLTransformSha512Id};
+  std::vector<xmlSecTransformId> transforms;
+  for (const Digest& digest : DigestTable()) transforms.push_back(digest.transform);
+  return transforms;
 }
 
 bool HasHref(xmlSecTransformId transform, const std::string& uri) {
@@ -49,10 +65,17 @@ SignatureMethod FindSignatureMethod(const std::string& uri) {
   for (const SignatureMethod& method : SignatureMethods()) {
     if (HasHref(method.transform, uri)) return method;
   }
-  return {xmlSecTransformIdUnknown, EVP_PKEY_NONE};
+  return {xmlSecTransformIdUnknown, EVP_PKEY_NONE, nullptr};
 }
 
 xmlSecTransformId FindDigestMethod(const std::string& uri) { return FindIn(Digests(), uri); }
+
+const EVP_MD* DigestAlgorithm(xmlSecTransformId digestMethod) {
+  for (const Digest& digest : DigestTable()) {
+    if (digest.transform == digestMethod) return digest.hash;
+  }
+  return nullptr;
+}
 
 xmlSecTransformId FindReferenceTransform(const std::string& uri) {
   if (HasHref(xmlSecTransformEnvelopedId, uri)) return xmlSecTransformEnvelopedId;

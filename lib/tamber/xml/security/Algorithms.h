@@ -7,6 +7,7 @@
 #include <string>
 #include <vector>
 
+#include <openssl/evp.h>
 #include <xmlsec/transforms.h>
 
 namespace Tamber {
@@ -16,6 +17,7 @@ namespace Security {
 struct SignatureMethod {
   xmlSecTransformId transform;
   int keyType;  // EVP_PKEY_RSA or EVP_PKEY_EC
+  const EVP_MD* digest;  // the hash that is signed
 };
 
 // Canonical XML 1.0 and Exclusive XML Canonicalization 1.0, with and without comments. The
@@ -25,6 +27,8 @@ xmlSecTransformId FindCanonicalizationMethod(const std::string& uri);
 SignatureMethod FindSignatureMethod(const std::string& uri);
 // SHA-256/384/512; null when not accepted.
 xmlSecTransformId FindDigestMethod(const std::string& uri);
+// The OpenSSL hash of a digest method that FindDigestMethod returned.
+const EVP_MD* DigestAlgorithm(xmlSecTransformId digestMethod);
 // Enveloped signature and the canonicalisations; null when not accepted.
 xmlSecTransformId FindReferenceTransform(const std::string& uri);
 

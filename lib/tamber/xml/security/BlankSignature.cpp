@@ -1,8 +1,14 @@
-#include <memory>
+#include <new>
+#include <string>
+#include <vector>
 
 #include <openssl/evp.h>
+#include <xmlsec/strings.h>
 #include <xmlsec/templates.h>
+#include <xmlsec/xmltree.h>
 
+#include "tamber/Panic.h"
+#include "tamber/StringUtil.h"
 #include "tamber/crypto/OpenSsl.h"
 #include "tamber/xml/LibXml.h"
 #include "tamber/xml/NodeImpl.h"
@@ -10,7 +16,9 @@
 #include "tamber/xml/security/Ids.h"
 #include "tamber/xml/security/Signature.h"
 #include "tamber/xml/security/SignatureSyntax.h"
-#include "tamber/xml/security/XmlSecContext.h"
+#include "tamber/xml/security/SignatureValue.h"
+#include "tamber/xml/security/SubtreeCanonicalization.h"
+#include "tamber/xml/security/XmlSec.h"
 
 namespace Tamber {
 namespace Xml {
@@ -18,9 +26,28 @@ namespace Security {
 
 namespace {
 
+// The child of a template element that xmlsec created (so it exists).
+xmlNodePtr TemplateChild(xmlNodePtr parent, const xmlChar* name) {
+  xmlNodePtr child = xmlSecFindChild(parent, name, xmlSecDSigNs);
+  TAMBER_VERIFY(child != nullptr);
+  return child;
+}
+
+// Base64 in lines of 64 characters, as XML signatures are commonly written, as the only content
+// of `element`.
+void SetBase64Content(xmlNodePtr element, const std::vector<unsigned char>& bytes) {
+  std::string text = StringUtil::Base64Encode(bytes);
+  for (size_t at = 64; at < text.size(); at += 65) text.insert(at, 1, '\n');
+  while (element->children != nullptr) FreeXmlSubtree(element->children);
+  xmlNodePtr content = xmlNewDocTextLen(element->doc, BAD_CAST text.data(), static_cast<int>(text.size()));
+  if (content == nullptr) throw std::bad_alloc();
+  LinkAsLastChild(element, content);
+}
+
 class BuiltReference final : public Reference {
  public:
-  BuiltReference(xmlNodePtr node, const std::string& uri) : _node(node), _uri(uri) {}
+  BuiltReference(xmlNodePtr node, const std::string& uri, const EVP_MD* digest)
+      : _node(node), _uri(uri), _digest(digest) {}
 
   const std::string& GetURI() const override { return _uri; }
 
@@ -29,14 +56,45 @@ class BuiltReference final : public Reference {
     if (transform == xmlSecTransformIdUnknown) {
       throw InvalidArgumentException("Unsupported transform \"" + algorithmUri + "\"");
     }
-    if (xmlSecTmplReferenceAddTransform(_node, transform) == nullptr) {
-      throw XmlSecurityException("Transform \"" + algorithmUri + "\" cannot be added");
+    // Canonicalisation turns the node set into octets: nothing can be taken out of it afterwards.
+    if (_canonicalization != xmlSecTransformIdUnknown) {
+      throw InvalidArgumentException("Transform \"" + algorithmUri +
+                                     "\" cannot follow a canonicalization; expected it to be the last transform");
     }
+    xmlNodePtr node = xmlSecTmplReferenceAddTransform(_node, transform);
+    if (node == nullptr) throw XmlSecurityException("Transform \"" + algorithmUri + "\" cannot be added");
+    if (transform == xmlSecTransformEnvelopedId) {
+      _enveloped = true;
+    } else {
+      _canonicalization = transform;
+      _canonicalizationNode = node;
+    }
+  }
+
+  // Writes the digest of `referenced` into ds:DigestValue. Without a canonicalisation the node
+  // set is canonicalised inclusively; a bare-name reference never includes comments.
+  void WriteDigest(xmlNodePtr referenced, xmlNodePtr signature) const {
+    const Canonicalization form =
+        _canonicalizationNode != nullptr
+            ? Canonicalization{_canonicalization, false, InclusivePrefixesOf(_canonicalizationNode)}
+            : Canonicalization{xmlSecTransformInclC14NId, false, ""};
+    const std::string octets = CanonicalizeSubtree(referenced, _enveloped ? signature : nullptr, form);
+    std::vector<unsigned char> digest(EVP_MAX_MD_SIZE);
+    unsigned int length = 0;
+    if (EVP_Digest(octets.data(), octets.size(), digest.data(), &length, _digest, nullptr) != 1) {
+      throw XmlSecurityException("Digest of \"" + _uri + "\" failed: " + Crypto::TakeOpenSslError());
+    }
+    digest.resize(length);
+    SetBase64Content(TemplateChild(_node, xmlSecNodeDigestValue), digest);
   }
 
  private:
   xmlNodePtr const _node;  // the ds:Reference, owned by the signature's element
   const std::string _uri;
+  const EVP_MD* const _digest;
+  xmlSecTransformId _canonicalization = xmlSecTransformIdUnknown;
+  xmlNodePtr _canonicalizationNode = nullptr;  // its ds:Transform, which may name inclusive prefixes
+  bool _enveloped = false;
 };
 
 // Links the signature's element, while it is in no tree, as the last child of the context for the
@@ -63,11 +121,14 @@ class TemporaryPlacement {
 };
 
 // A signature being built: an xmlsec template in the context's document, outside its tree until
-// the caller appends GetElement() where it belongs.
+// the caller appends GetElement() where it belongs. Signed without xmlsec's signature context:
+// its node sets, transform chains and key checks cost more than the RSA signature itself adds on
+// top of canonicalising and hashing.
 class BlankSignature final : public Signature {
  public:
-  BlankSignature(ElementNode* context, xmlNodePtr element, SignatureMethod method)
-      : _context(context), _element(element), _method(method) {}
+  BlankSignature(ElementNode* context, xmlNodePtr element, xmlSecTransformId canonicalization,
+                 SignatureMethod method)
+      : _context(context), _element(element), _canonicalization(canonicalization), _method(method) {}
 
   const std::vector<Ref<Reference>>& GetReferences() const override { return _references; }
 
@@ -83,8 +144,9 @@ class BlankSignature final : public Signature {
     if (digest == xmlSecTransformIdUnknown) throw InvalidArgumentException("Unsupported digest method \"" + digestUri + "\"");
     xmlNodePtr node = xmlSecTmplSignatureAddReference(_element, digest, nullptr, BAD_CAST uri.c_str(), nullptr);
     if (node == nullptr) throw XmlSecurityException("Reference \"" + uri + "\" cannot be added");
-    Ref<Reference> reference(new BuiltReference(node, uri));
+    Ref<BuiltReference> reference(new BuiltReference(node, uri, DigestAlgorithm(digest)));
     _references.push_back(reference);
+    _builtReferences.push_back(reference);
     return reference.get();
   }
 
@@ -104,19 +166,22 @@ class BlankSignature final : public Signature {
       throw InvalidArgumentException("Signature method \"" + std::string(reinterpret_cast<const char*>(_method.transform->href)) +
                                      "\" cannot sign with an " + key->GetAlgorithm() + " key");
     }
-    EnsureXmlSecInitialized();
     ResolvePendingNamespaces(_context.get());
     xmlNodePtr context = ToXmlNode(_context.get());
-    std::vector<std::unique_ptr<ScopedIdRegistration>> registrations;
-    for (const Ref<Reference>& reference : _references) {
-      registrations.emplace_back(new ScopedIdRegistration(FindReferencedAttribute(context, reference->GetURI())));
+    std::vector<xmlNodePtr> referenced;
+    for (const Ref<BuiltReference>& reference : _builtReferences) {
+      referenced.push_back(FindReferencedAttribute(context, reference->GetURI())->parent);
     }
     TemporaryPlacement placement(_element, context);
-    ScopedXmlSecErrorCapture errors;
-    DSigContextPtr signing = CreateRestrictedContext(pkey);
-    if (xmlSecDSigCtxSign(signing.get(), _element) < 0 || signing->status != xmlSecDSigStatusSucceeded) {
-      throw XmlSecurityException("Signing failed: " + errors.GetFirstError());
-    }
+    ResolvePendingNamespaces(_element);
+    for (size_t i = 0; i < _builtReferences.size(); ++i) _builtReferences[i]->WriteDigest(referenced[i], _element);
+    // Canonicalised in its temporary place; the exclusive form, which requests use, comes out the
+    // same wherever the caller puts the signature afterwards.
+    xmlNodePtr signedInfo = TemplateChild(_element, xmlSecNodeSignedInfo);
+    const Canonicalization form{_canonicalization, true,
+                                InclusivePrefixesOf(TemplateChild(signedInfo, xmlSecNodeCanonicalizationMethod))};
+    SetBase64Content(TemplateChild(_element, xmlSecNodeSignatureValue),
+                     ComputeSignatureValue(pkey, _method.digest, CanonicalizeSubtree(signedInfo, nullptr, form)));
   }
 
   ElementNode* GetElement() const override { return WrapXmlElement(_element); }
@@ -133,8 +198,10 @@ class BlankSignature final : public Signature {
 
   const Ref<ElementNode> _context;
   xmlNodePtr const _element;
+  const xmlSecTransformId _canonicalization;
   const SignatureMethod _method;
   std::vector<Ref<Reference>> _references;
+  std::vector<Ref<BuiltReference>> _builtReferences;  // the same, with their signing side
 };
 
 }  // namespace
@@ -157,7 +224,7 @@ void CreateBlankSignature(ElementNode* context, const std::string& canonicalizat
   if (element == nullptr) throw XmlSecurityException("The signature template cannot be created");
   // Owned by the document until the caller appends it: freed with it if never placed.
   TreeOf(contextNode)->AddLooseNode(element);
-  signature = new BlankSignature(context, element, method);
+  signature = new BlankSignature(context, element, canonicalization, method);
 }
 
 }  // namespace Security

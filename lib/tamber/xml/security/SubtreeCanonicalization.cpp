@@ -1,0 +1,90 @@
+#include "tamber/xml/security/SubtreeCanonicalization.h"
+
+#include <vector>
+
+#include <boost/algorithm/string/classification.hpp>
+#include <boost/algorithm/string/split.hpp>
+#include <libxml/c14n.h>
+#include <libxml/xmlIO.h>
+#include <xmlsec/strings.h>
+#include <xmlsec/xmltree.h>
+
+#include "tamber/xml/LibXml.h"
+#include "tamber/xml/security/Algorithms.h"
+#include "tamber/xml/security/Signature.h"
+
+namespace Tamber {
+namespace Xml {
+namespace Security {
+
+namespace {
+
+struct NodeSet {
+  xmlNodePtr root;
+  xmlNodePtr excluded;
+};
+
+bool IsInSubtree(xmlNodePtr node, xmlNodePtr root) {
+  for (; node != nullptr; node = node->parent) {
+    if (node == root) return true;
+  }
+  return false;
+}
+
+// An invisible ancestor's declarations still reach the root (inclusive form), as its namespace
+// nodes: attributes and namespace nodes belong where their element does.
+int IsVisible(void* set, xmlNodePtr node, xmlNodePtr parent) {
+  const auto* nodes = static_cast<const NodeSet*>(set);
+  xmlNodePtr owner = node->type == XML_NAMESPACE_DECL || node->type == XML_ATTRIBUTE_NODE ? parent : node;
+  if (!IsInSubtree(owner, nodes->root)) return 0;
+  return nodes->excluded == nullptr || !IsInSubtree(owner, nodes->excluded) ? 1 : 0;
+}
+
+int AppendToString(void* context, const char* buffer, int length) {
+  static_cast<std::string*>(context)->append(buffer, static_cast<size_t>(length));
+  return length;
+}
+
+}  // namespace
+
+std::string CanonicalizeSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form) {
+  NodeSet nodes{root, excluded};
+  const bool exclusive = IsExclusiveCanonicalization(form.algorithm);
+  const int mode = exclusive ? XML_C14N_EXCLUSIVE_1_0 : XML_C14N_1_0;
+  const int withComments = form.keepComments && CanonicalizationKeepsComments(form.algorithm) ? 1 : 0;
+  std::vector<std::string> prefixes;
+  if (exclusive) boost::split(prefixes, form.inclusivePrefixes, boost::is_any_of(" \t\r\n"), boost::token_compress_on);
+  std::vector<xmlChar*> prefixList;
+  for (std::string& prefix : prefixes) {
+    if (!prefix.empty()) prefixList.push_back(BAD_CAST &prefix[0]);
+  }
+  prefixList.push_back(nullptr);
+  std::string text;
+  ScopedXmlErrorCapture errors;
+  xmlOutputBufferPtr output = xmlOutputBufferCreateIO(&AppendToString, nullptr, &text, nullptr);
+  if (output == nullptr) throw XmlSecurityException("Canonicalization failed: out of memory");
+  int result = xmlC14NExecute(root->doc, &IsVisible, &nodes, mode, prefixList.size() > 1 ? prefixList.data() : nullptr,
+                              withComments, output);
+  int closed = xmlOutputBufferClose(output);
+  if (result < 0 || closed < 0) {
+    throw XmlSecurityException("Canonicalization failed: " +
+                               (errors.HasError() ? errors.GetFirstError() : std::string("unknown error")));
+  }
+  return text;
+}
+
+std::string InclusivePrefixesOf(xmlNodePtr method) {
+  for (const xmlChar* ns : {xmlSecNsExcC14N, xmlSecNsExcC14NWithComments}) {
+    if (xmlNodePtr inclusive = xmlSecFindChild(method, xmlSecNodeInclusiveNamespaces, ns)) {
+      xmlChar* list = xmlGetProp(inclusive, xmlSecAttrPrefixList);
+      std::string prefixes = list != nullptr ? reinterpret_cast<const char*>(list) : "";
+      xmlFree(list);
+      return prefixes;
+    }
+  }
+  return "";
+}
+
+}  // namespace Security
+}  // namespace Xml
+}  // namespace Tamber
