@@ -9,19 +9,19 @@ bash scripts/install-deps.sh
 
 jobs=$(nproc)
 
-echo "== Plain build"
-cmake -S . -B build -DCMAKE_BUILD_TYPE=RelWithDebInfo >/dev/null
+echo "== Plain build ($(date +%T))"
+cmake -S . -B build -DCMAKE_BUILD_TYPE=Release >/dev/null
 cmake --build build -j "$jobs"
 ctest --test-dir build --output-on-failure -j "$jobs"
 
-echo "== AddressSanitizer + UndefinedBehaviorSanitizer build"
+echo "== AddressSanitizer + UndefinedBehaviorSanitizer build ($(date +%T))"
 bash scripts/configure-sanitized.sh
 cmake --build build-asan -j "$jobs"
 ASAN_OPTIONS=detect_leaks=1:abort_on_error=0:halt_on_error=1 \
 UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1 \
   ctest --test-dir build-asan --output-on-failure -j "$jobs"
 
-echo "== ThreadSanitizer build (the suites that run work on several threads)"
+echo "== ThreadSanitizer build, the suites that run work on several threads ($(date +%T))"
 concurrent_suites=(
   RefTest LoggingTest ThreadPoolTest UserAgentTest
   LoggerTest HttpsClientTest AsyncOperationsTest GssNegotiationTest SecurityTokenServiceImplTest
@@ -38,5 +38,6 @@ for suite in "${concurrent_suites[@]}"; do
     --gtest_filter='-*SizeLimit*:*Oversized*'
 done
 
-echo "== Fuzzing the token parser for 60 seconds"
+echo "== Fuzzing the token parser for 60 seconds ($(date +%T))"
 bash scripts/fuzz.sh 60
+echo "== All passed ($(date +%T))"
