@@ -29,7 +29,8 @@ concurrent_suites=(
 for suite in tests/e2e/*Test.cpp; do
   [ -e "$suite" ] && concurrent_suites+=("$(basename "$suite" .cpp)")
 done
-cmake -S . -B build-tsan -DCMAKE_BUILD_TYPE=RelWithDebInfo -DSSOCLIENT_TSAN=ON >/dev/null
+cmake -S . -B build-tsan -DCMAKE_BUILD_TYPE=Debug -DCMAKE_C_FLAGS_DEBUG="-O1 -g1" -DCMAKE_CXX_FLAGS_DEBUG="-O1 -g1" \
+  -DSSOCLIENT_TSAN=ON >/dev/null
 cmake --build build-tsan -j "$jobs" --target "${concurrent_suites[@]}"
 for suite in "${concurrent_suites[@]}"; do
   echo "-- $suite"
