@@ -70,9 +70,11 @@ void UserAgentImpl::Configure() {
   TAMBER_CURL_SET(easy, CURLOPT_SSL_VERIFYPEER, !pinned && ssl->GetSSLContext().VerifiesPeer() ? 1L : 0L);
   TAMBER_CURL_SET(easy, CURLOPT_SSL_VERIFYHOST, !pinned && ssl->GetSSLContext().VerifiesHostName() ? 2L : 0L);
   TAMBER_CURL_SET(easy, CURLOPT_SSL_CTX_FUNCTION, &Transfer::OnSslContext);
+  // libcurl loads its CA bundle into the TLS context's store after our callback has put the
+  // context's own anchors there, and may hand a store it cached from another connection to the
+  // next one: either would trust more than the anchors given. Load nothing, cache nothing.
+  TAMBER_CURL_SET(easy, CURLOPT_CA_CACHE_TIMEOUT, 0L);
   if (pinned || !ssl->GetSSLContext().GetTrustedCertificates().empty()) {
-    // The handshake then trusts only the pin or the context's own anchors; libcurl would still
-    // parse the whole system CA bundle for every connection (about 15 ms) before replacing it.
     TAMBER_CURL_SET(easy, CURLOPT_CAINFO, static_cast<const char*>(nullptr));
     TAMBER_CURL_SET(easy, CURLOPT_CAPATH, static_cast<const char*>(nullptr));
   }

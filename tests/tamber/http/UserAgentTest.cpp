@@ -246,6 +246,18 @@ INSTANTIATE_TEST_SUITE_P(
                     TlsRefusal{"host name not in the certificate", "tls-server", {"ca"}, "other.example",
                                "hostname mismatch"}));
 
+TEST(UserAgent, TrustsOnlyItsOwnContextsAnchorsWhateverOtherAgentsTrusted) {
+  HttpsTestServer server;
+  Ref<Ssl::SSLContext> trusting = Context({"ca"});
+  EXPECT_EQ(200, Send(Agent(Tls(server.GetPort(), trusting.get(), "", "127.0.0.1").get()).get())->GetStatusCode());
+  Ref<Ssl::SSLContext> other = Context({"untrusted"});
+  Ref<UserAgent> agent = Agent(Tls(server.GetPort(), other.get(), "", "127.0.0.1").get());
+  EXPECT_EQ("HTTPS request to 127.0.0.1:" + std::to_string(server.GetPort()) +
+                " failed: the server certificate was refused: unable to get local issuer certificate",
+            FailureOf(agent.get()));
+  EXPECT_EQ(1u, server.GetRequests().size());
+}
+
 TEST(UserAgent, AcceptsTheNameTheCertificateProvesOverAnotherTcpHost) {
   HttpsTestServer::Options options;
   options.certificate = "tls-other";
