@@ -7,7 +7,7 @@
 #include "tamber/service/Logging.h"
 
 // Formats and emits one message at `level` when the library's logger is at least at that level.
-// The arguments are evaluated only then, so descriptions of tokens and specifications cost
+// The arguments are evaluated only then, so descriptions of tokens and token requests cost
 // nothing while tracing is off.
 #define SSOCLIENT_LOG(level, ...)                                                \
   do {                                                                           \

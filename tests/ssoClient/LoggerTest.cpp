@@ -65,7 +65,7 @@ TEST(GetLoggerTest, LaterCallsReturnThePublishedLogger) {
 
 TEST(GetLoggerTest, TracingIsOffByDefault) { EXPECT_LT(getLogger()->GetLevel(), Tamber::Service::LOG_TRACE); }
 
-// Stands for a costly description of a token or specification; counts its calls.
+// Stands for a costly description of a token or a token request; counts its calls.
 int descriptions = 0;
 std::string Describe() {
   ++descriptions;
