@@ -8,6 +8,7 @@
 #include <string>
 
 #include <openssl/bio.h>
+#include <openssl/ecdsa.h>
 #include <openssl/evp.h>
 #include <openssl/x509.h>
 
@@ -23,12 +24,16 @@ struct OpenSslDeleter {
   void operator()(BIO* p) const { BIO_free(p); }
   void operator()(X509_STORE* p) const { X509_STORE_free(p); }
   void operator()(X509_STORE_CTX* p) const { X509_STORE_CTX_free(p); }
+  void operator()(EVP_MD_CTX* p) const { EVP_MD_CTX_free(p); }
+  void operator()(ECDSA_SIG* p) const { ECDSA_SIG_free(p); }
 };
 using X509Ptr = std::unique_ptr<X509, OpenSslDeleter>;
 using EvpPkeyPtr = std::unique_ptr<EVP_PKEY, OpenSslDeleter>;
 using BioPtr = std::unique_ptr<BIO, OpenSslDeleter>;
 using X509StorePtr = std::unique_ptr<X509_STORE, OpenSslDeleter>;
 using X509StoreCtxPtr = std::unique_ptr<X509_STORE_CTX, OpenSslDeleter>;
+using EvpMdCtxPtr = std::unique_ptr<EVP_MD_CTX, OpenSslDeleter>;
+using EcdsaSigPtr = std::unique_ptr<ECDSA_SIG, OpenSslDeleter>;
 
 // The certificate's X509 object, owned by the certificate (valid while it lives). Raises
 // TypeMismatchException for a Certificate that is not the layer's own.

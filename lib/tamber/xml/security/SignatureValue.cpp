@@ -1,9 +1,5 @@
 #include "tamber/xml/security/SignatureValue.h"
 
-#include <memory>
-
-#include <openssl/ecdsa.h>
-
 #include "tamber/crypto/OpenSsl.h"
 #include "tamber/xml/security/Signature.h"
 
@@ -13,17 +9,12 @@ namespace Security {
 
 namespace {
 
-struct Deleter {
-  void operator()(EVP_MD_CTX* context) const { EVP_MD_CTX_free(context); }
-  void operator()(ECDSA_SIG* signature) const { ECDSA_SIG_free(signature); }
-};
-
 [[noreturn]] void Fail() { throw XmlSecurityException("Signing failed: " + Crypto::TakeOpenSslError()); }
 
 // OpenSSL writes ECDSA signatures in DER; XML signatures carry r || s of fixed width.
 std::vector<unsigned char> FromDer(EVP_PKEY* key, const std::vector<unsigned char>& der) {
   const unsigned char* cursor = der.data();
-  std::unique_ptr<ECDSA_SIG, Deleter> signature(d2i_ECDSA_SIG(nullptr, &cursor, static_cast<long>(der.size())));
+  Crypto::EcdsaSigPtr signature(d2i_ECDSA_SIG(nullptr, &cursor, static_cast<long>(der.size())));
   if (!signature) Fail();
   const int half = (EVP_PKEY_get_bits(key) + 7) / 8;
   std::vector<unsigned char> value(2 * static_cast<size_t>(half));
@@ -37,7 +28,7 @@ std::vector<unsigned char> FromDer(EVP_PKEY* key, const std::vector<unsigned cha
 }  // namespace
 
 std::vector<unsigned char> ComputeSignatureValue(EVP_PKEY* key, const EVP_MD* digest, const std::string& data) {
-  std::unique_ptr<EVP_MD_CTX, Deleter> context(EVP_MD_CTX_new());
+  Crypto::EvpMdCtxPtr context(EVP_MD_CTX_new());
   std::vector<unsigned char> signature(static_cast<size_t>(EVP_PKEY_get_size(key)));
   size_t length = signature.size();
   if (!context || EVP_DigestSignInit(context.get(), nullptr, digest, nullptr, key) != 1 ||
