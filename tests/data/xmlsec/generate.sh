@@ -63,6 +63,11 @@ edit assertion-rsa.xml tampered-digest.xml \
 edit assertion-rsa.xml tampered-signature-value.xml \
   "re.sub(r'<ds:SignatureValue>(.)', lambda m: '<ds:SignatureValue>' + ('A' if m.group(1) != 'A' else 'B'), text, count=1)"
 edit assertion-rsa.xml signature-value-not-base64.xml "text.replace('<ds:SignatureValue>', '<ds:SignatureValue>*')"
+edit assertion-rsa.xml digest-value-not-base64.xml "text.replace('<ds:DigestValue>', '<ds:DigestValue>*')"
+edit assertion-ec.xml ec-signature-value-truncated.xml \
+  "re.sub(r'<ds:SignatureValue>[^<]*', '<ds:SignatureValue>AAAA', text)"
+edit assertion-rsa.xml transform-after-canonicalization.xml \
+  "text.replace('<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/>', '<ds:Transform Algorithm=\"http://www.w3.org/2001/10/xml-exc-c14n#\"/><ds:Transform Algorithm=\"http://www.w3.org/2000/09/xmldsig#enveloped-signature\"/>', 1)"
 edit assertion-rsa.xml tampered-content.xml "text.replace('user@example.com', 'admin@example.com')"
 edit assertion-rsa.xml md5-digest.xml \
   "text.replace('http://www.w3.org/2001/04/xmlenc#sha256', 'http://www.w3.org/2001/04/xmldsig-more#md5')"

@@ -82,19 +82,6 @@ xmlSecTransformId FindReferenceTransform(const std::string& uri) {
   return FindIn(Canonicalizations(), uri);
 }
 
-std::vector<xmlSecTransformId> SignedInfoTransforms() {
-  std::vector<xmlSecTransformId> transforms = Canonicalizations();
-  for (const SignatureMethod& method : SignatureMethods()) transforms.push_back(method.transform);
-  return transforms;
-}
-
-std::vector<xmlSecTransformId> ReferenceTransforms() {
-  std::vector<xmlSecTransformId> transforms = Canonicalizations();
-  transforms.push_back(xmlSecTransformEnvelopedId);
-  for (xmlSecTransformId digest : Digests()) transforms.push_back(digest);
-  return transforms;
-}
-
 bool IsExclusiveCanonicalization(xmlSecTransformId transform) {
   return transform == xmlSecTransformExclC14NId || transform == xmlSecTransformExclC14NWithCommentsId;
 }

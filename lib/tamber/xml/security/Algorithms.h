@@ -32,11 +32,6 @@ const EVP_MD* DigestAlgorithm(xmlSecTransformId digestMethod);
 // Enveloped signature and the canonicalisations; null when not accepted.
 xmlSecTransformId FindReferenceTransform(const std::string& uri);
 
-// Everything a ds:SignedInfo may use (canonicalisation and signature methods), and everything a
-// ds:Reference may use (transforms and digests), for xmlsec's allow-lists.
-std::vector<xmlSecTransformId> SignedInfoTransforms();
-std::vector<xmlSecTransformId> ReferenceTransforms();
-
 // The canonicalisation transforms.
 bool IsExclusiveCanonicalization(xmlSecTransformId transform);
 bool CanonicalizationKeepsComments(xmlSecTransformId transform);

@@ -1,7 +1,5 @@
 #include "tamber/xml/security/Ids.h"
 
-#include <libxml/valid.h>
-
 #include "tamber/xml/TreeWalk.h"
 #include "tamber/xml/security/Signature.h"
 
@@ -42,21 +40,6 @@ std::vector<xmlAttrPtr> FindIdAttributes(xmlNodePtr root, const std::string& id)
     }
   });
   return found;
-}
-
-ScopedIdRegistration::ScopedIdRegistration(xmlAttrPtr attribute) {
-  std::string id = GetAttributeValue(attribute);
-  xmlAttrPtr known = xmlGetID(attribute->doc, BAD_CAST id.c_str());
-  if (known == attribute) return;
-  if (known != nullptr) throw XmlSecurityException("ID \"" + id + "\" is not unique in the document");
-  if (xmlAddID(nullptr, attribute->doc, BAD_CAST id.c_str(), attribute) == nullptr) {
-    throw XmlSecurityException("ID \"" + id + "\" cannot be registered");
-  }
-  _registered = attribute;
-}
-
-ScopedIdRegistration::~ScopedIdRegistration() {
-  if (_registered != nullptr) xmlRemoveID(_registered->doc, _registered);
 }
 
 }  // namespace Security

@@ -2,16 +2,17 @@
 #include <string>
 #include <vector>
 
+#include <openssl/crypto.h>
 #include <openssl/evp.h>
 
 #include "tamber/crypto/OpenSsl.h"
 #include "tamber/xml/LibXml.h"
 #include "tamber/xml/security/Ids.h"
-#include "tamber/xml/security/IsolatedCopy.h"
 #include "tamber/xml/security/Signature.h"
 #include "tamber/xml/security/SignatureSyntax.h"
+#include "tamber/xml/security/SignatureValue.h"
+#include "tamber/xml/security/SubtreeCanonicalization.h"
 #include "tamber/xml/security/TrustChainKeyResolver.h"
-#include "tamber/xml/security/XmlSecContext.h"
 
 namespace Tamber {
 namespace Xml {
@@ -31,17 +32,30 @@ class ParsedReference final : public Reference {
   const std::string _uri;
 };
 
-// Canonical XML 1.0 inherits the xml:* attributes of ancestors; the exclusive form does not. A
-// reference without canonicalisation transform is canonicalised inclusively by default.
-bool AnyReferenceInheritsXmlAttributes(const SignatureDescription& description) {
-  for (const ReferenceDescription& reference : description.references) {
-    bool inclusive = true;
-    for (xmlSecTransformId transform : reference.transforms) {
-      if (transform != xmlSecTransformEnvelopedId) inclusive = !IsExclusiveCanonicalization(transform);
+// The bytes a reference's digest covers: the signed element, less the ds:Signature when the
+// reference has the enveloped-signature transform, canonicalised by its last transform (inclusive
+// Canonical XML 1.0 when it has none). Same-document references select no comments.
+std::string ReferencedBytes(xmlNodePtr signedNode, xmlNodePtr signatureNode, const ReferenceDescription& reference) {
+  Canonicalization form{xmlSecTransformInclC14NId, false, ""};
+  xmlNodePtr excluded = nullptr;
+  for (xmlSecTransformId transform : reference.transforms) {
+    if (transform == xmlSecTransformEnvelopedId) {
+      excluded = signatureNode;
+    } else {
+      form.algorithm = transform;
+      form.inclusivePrefixes = reference.inclusivePrefixes;
     }
-    if (inclusive) return true;
   }
-  return false;
+  return CanonicalizeSubtree(signedNode, excluded, form);
+}
+
+bool DigestMatches(const std::string& bytes, const ReferenceDescription& reference) {
+  unsigned char digest[EVP_MAX_MD_SIZE];
+  unsigned int length = 0;
+  if (EVP_Digest(bytes.data(), bytes.size(), digest, &length, DigestAlgorithm(reference.digestMethod), nullptr) != 1) {
+    throw XmlSecurityException("Digest failed: " + Crypto::TakeOpenSslError());
+  }
+  return length == reference.digestValue.size() && CRYPTO_memcmp(digest, reference.digestValue.data(), length) == 0;
 }
 
 // A signature read from a document, to be verified on its signed element alone.
@@ -56,29 +70,23 @@ class ParsedSignature final : public Signature {
 
   const std::vector<Ref<Reference>>& GetReferences() const override { return _references; }
 
+  // The signed element is verified in place: "" means the signed element, "#id" must name it,
+  // nothing is copied, registered or fetched, and the caller's document is only read.
   bool Verify(const KeyInfoResolver* resolver, std::vector<ElementNode*>& verifiedElements) const override {
     if (resolver == nullptr) throw InvalidArgumentException("Verify needs a key resolver");
     const auto* trust = DynamicCast<const TrustChainKeyResolverImpl>(resolver);
-    EnsureXmlSecInitialized();
     xmlNodePtr signedNode = ToXmlNode(_signedElement.get());
-    std::string id = CheckReferencesNameTheSignedElement(signedNode);
+    CheckReferencesNameTheSignedElement(signedNode);
 
     std::vector<Ref<const Crypto::Certificate>> keys = trust->SelectCertificates(_description.keyInfoCertificates);
-    if (keys.empty()) return false;
-
-    IsolatedCopy copy(signedNode, ToXmlNode(_signatureElement.get()), AnyReferenceInheritsXmlAttributes(_description));
-    std::unique_ptr<ScopedIdRegistration> registration;
-    if (!id.empty()) registration.reset(new ScopedIdRegistration(FindIdAttribute(copy.GetRoot())));
-    for (const Ref<const Crypto::Certificate>& certificate : keys) {
-      EVP_PKEY* key = Crypto::GetPublicKey(*certificate);
-      if (key == nullptr || EVP_PKEY_get_base_id(key) != _description.signatureMethod.keyType) continue;
-      if (VerifyWithKey(copy.GetInner(), key)) {
-        CheckResolvedToRoot(copy, id);
-        verifiedElements.assign(1, _signedElement.get());
-        return true;
+    if (keys.empty() || !SignedInfoVerifies(keys)) return false;
+    for (const ReferenceDescription& reference : _description.references) {
+      if (!DigestMatches(ReferencedBytes(signedNode, ToXmlNode(_signatureElement.get()), reference), reference)) {
+        return false;
       }
     }
-    return false;
+    verifiedElements.assign(1, _signedElement.get());
+    return true;
   }
 
   Reference* AddReference(const std::string&, const std::string&) override { ThrowReadOnly(); }
@@ -93,8 +101,8 @@ class ParsedSignature final : public Signature {
 
   // Every reference must name the signed element itself ("" or "#" + its ID), and that ID must
   // name nothing else in the whole document (wrapping attacks put a second element with it
-  // elsewhere). Returns the ID ("" when the references use "" only).
-  std::string CheckReferencesNameTheSignedElement(xmlNodePtr signedNode) const {
+  // elsewhere).
+  void CheckReferencesNameTheSignedElement(xmlNodePtr signedNode) const {
     xmlAttrPtr idAttribute = FindIdAttribute(signedNode);
     std::string id = idAttribute != nullptr ? GetAttributeValue(idAttribute) : "";
     bool byId = false;
@@ -105,31 +113,28 @@ class ParsedSignature final : public Signature {
       }
       byId = true;
     }
-    if (!byId) return "";
+    if (!byId) return;
     xmlNodePtr top = signedNode;
     while (top->parent != nullptr && top->parent->type == XML_ELEMENT_NODE) top = top->parent;
     if (FindIdAttributes(top, id).size() != 1) {
       throw XmlSecurityException("ID \"" + id + "\" of the signed element is not unique in the document");
     }
-    return id;
   }
 
-  static bool VerifyWithKey(xmlNodePtr signature, EVP_PKEY* key) {
-    ScopedXmlSecErrorCapture errors;
-    DSigContextPtr context = CreateRestrictedContext(key);
-    // xmlsec answers 0 for an invalid signature as well: the verdict is the status.
-    if (xmlSecDSigCtxVerify(context.get(), signature) < 0) {
-      throw XmlSecurityException("Signature cannot be verified: " + errors.GetFirstError());
+  // True when one of `keys` signed the canonical ds:SignedInfo.
+  bool SignedInfoVerifies(const std::vector<Ref<const Crypto::Certificate>>& keys) const {
+    const SignatureMethod& method = _description.signatureMethod;
+    std::string signedInfo = CanonicalizeSubtree(
+        _description.signedInfo, nullptr,
+        Canonicalization{_description.canonicalizationMethod, true, _description.inclusivePrefixes});
+    for (const Ref<const Crypto::Certificate>& certificate : keys) {
+      EVP_PKEY* key = Crypto::GetPublicKey(*certificate);
+      if (key != nullptr && EVP_PKEY_get_base_id(key) == method.keyType &&
+          VerifySignatureValue(key, method.digest, signedInfo, _description.signatureValue)) {
+        return true;
+      }
     }
-    return context->status == xmlSecDSigStatusSucceeded;
-  }
-
-  static void CheckResolvedToRoot(const IsolatedCopy& copy, const std::string& id) {
-    if (id.empty()) return;
-    xmlAttrPtr resolved = xmlGetID(copy.GetRoot()->doc, BAD_CAST id.c_str());
-    if (resolved == nullptr || resolved->parent != copy.GetRoot()) {
-      throw XmlSecurityException("Reference URI \"#" + id + "\" did not resolve to the signed element");
-    }
+    return false;
   }
 
   const Ref<ElementNode> _signedElement;

@@ -87,23 +87,29 @@ std::string ReadAlgorithm(xmlNodePtr element) {
 }
 
 // A canonicalisation element may carry the exclusive form's InclusiveNamespaces, nothing else.
-void ReadCanonicalizationParameters(xmlNodePtr element, xmlSecTransformId transform) {
+// Returns its prefix list.
+std::string ReadCanonicalizationParameters(xmlNodePtr element, xmlSecTransformId transform) {
   ChildElements children(element);
-  while (xmlNodePtr child = children.Next()) {
-    if (!IsExclusiveCanonicalization(transform) || !Is(child, xmlSecNsExcC14N, xmlSecNodeInclusiveNamespaces)) {
-      RefuseUnexpected(child, element);
-    }
+  xmlNodePtr inclusive = children.Next();
+  if (inclusive == nullptr) return "";
+  if (!IsExclusiveCanonicalization(transform) || !Is(inclusive, xmlSecNsExcC14N, xmlSecNodeInclusiveNamespaces)) {
+    RefuseUnexpected(inclusive, element);
   }
+  ExpectEnd(children);
+  xmlChar* list = xmlGetNoNsProp(inclusive, xmlSecAttrPrefixList);
+  std::string prefixes = Text(list);
+  xmlFree(list);
+  return prefixes;
 }
 
-xmlSecTransformId ReadCanonicalizationMethod(xmlNodePtr element) {
+void ReadCanonicalizationMethod(xmlNodePtr element, SignatureDescription& description) {
   std::string algorithm = ReadAlgorithm(element);
   xmlSecTransformId transform = FindCanonicalizationMethod(algorithm);
   if (transform == xmlSecTransformIdUnknown || algorithm != Text(transform->href)) {
     Refuse("Canonicalization method \"" + algorithm + "\" is not accepted");
   }
-  ReadCanonicalizationParameters(element, transform);
-  return transform;
+  description.canonicalizationMethod = transform;
+  description.inclusivePrefixes = ReadCanonicalizationParameters(element, transform);
 }
 
 SignatureMethod ReadSignatureMethod(xmlNodePtr element) {
@@ -115,14 +121,29 @@ SignatureMethod ReadSignatureMethod(xmlNodePtr element) {
   return method;
 }
 
-xmlSecTransformId ReadTransform(xmlNodePtr element) {
+void ReadTransform(xmlNodePtr element, ReferenceDescription& reference) {
   std::string algorithm = ReadAlgorithm(element);
   xmlSecTransformId transform = FindReferenceTransform(algorithm);
   if (transform == xmlSecTransformIdUnknown || algorithm != Text(transform->href)) {
     Refuse("Transform \"" + algorithm + "\" is not accepted");
   }
-  ReadCanonicalizationParameters(element, transform);
-  return transform;
+  if (!reference.transforms.empty() && reference.transforms.back() != xmlSecTransformEnvelopedId) {
+    Refuse("Transform \"" + algorithm + "\" after a canonicalization is not accepted");
+  }
+  reference.transforms.push_back(transform);
+  reference.inclusivePrefixes = ReadCanonicalizationParameters(element, transform);
+}
+
+// The bytes of a ds:DigestValue or ds:SignatureValue.
+std::vector<unsigned char> ReadBase64(xmlNodePtr element) {
+  xmlChar* text = xmlNodeGetContent(element);
+  std::string base64 = Text(text);
+  xmlFree(text);
+  try {
+    return StringUtil::Base64Decode(base64);
+  } catch (const Base64FormatException& e) {
+    Refuse(Ds(element->name) + " is not base64: " + std::string(e.what()));
+  }
 }
 
 ReferenceDescription ReadReference(xmlNodePtr element) {
@@ -148,7 +169,7 @@ ReferenceDescription ReadReference(xmlNodePtr element) {
       if (reference.transforms.size() == kMaxTransforms) {
         Refuse("Too many transforms in a reference (at most " + std::to_string(kMaxTransforms) + " are accepted)");
       }
-      reference.transforms.push_back(ReadTransform(transform));
+      ReadTransform(transform, reference);
     }
     next = children.Next();
   }
@@ -160,14 +181,15 @@ ReferenceDescription ReadReference(xmlNodePtr element) {
   if (reference.digestMethod == xmlSecTransformIdUnknown) Refuse("Digest method \"" + digest + "\" is not accepted");
   ChildElements digestChildren(next);
   ExpectEnd(digestChildren);
-  children.Expect(xmlSecNodeDigestValue);
+  reference.digestValue = ReadBase64(children.Expect(xmlSecNodeDigestValue));
   ExpectEnd(children);
   return reference;
 }
 
 void ReadSignedInfo(xmlNodePtr element, SignatureDescription& description) {
   ChildElements children(element);
-  description.canonicalizationMethod = ReadCanonicalizationMethod(children.Expect(xmlSecNodeCanonicalizationMethod));
+  description.signedInfo = element;
+  ReadCanonicalizationMethod(children.Expect(xmlSecNodeCanonicalizationMethod), description);
   description.signatureMethod = ReadSignatureMethod(children.Expect(xmlSecNodeSignatureMethod));
   while (xmlNodePtr child = children.Next()) {
     if (!IsDs(child, xmlSecNodeReference)) RefuseUnexpected(child, element);
@@ -180,15 +202,7 @@ void ReadSignedInfo(xmlNodePtr element, SignatureDescription& description) {
 }
 
 Ref<const Crypto::Certificate> ReadCertificate(xmlNodePtr element) {
-  xmlChar* text = xmlNodeGetContent(element);
-  std::string base64 = Text(text);
-  xmlFree(text);
-  std::vector<unsigned char> der;
-  try {
-    der = StringUtil::Base64Decode(base64);
-  } catch (const Base64FormatException& e) {
-    Refuse("ds:X509Certificate is not base64: " + std::string(e.what()));
-  }
+  std::vector<unsigned char> der = ReadBase64(element);
   Ref<const Crypto::Certificate> certificate;
   try {
     Crypto::CreateCertificate(der.data(), der.size(), certificate);
@@ -230,7 +244,7 @@ SignatureDescription ReadSignature(xmlNodePtr signature) {
   SignatureDescription description;
   ChildElements children(signature);
   ReadSignedInfo(children.Expect(xmlSecNodeSignedInfo), description);
-  children.Expect(xmlSecNodeSignatureValue);
+  description.signatureValue = ReadBase64(children.Expect(xmlSecNodeSignatureValue));
   xmlNodePtr next = children.Next();
   if (next != nullptr && IsDs(next, xmlSecNodeKeyInfo)) {
     ReadKeyInfo(next, description);

@@ -23,14 +23,20 @@ constexpr size_t kMaxTransforms = 4;
 
 struct ReferenceDescription {
   std::string uri;                           // "" or "#id"
-  std::vector<xmlSecTransformId> transforms;  // in order
+  // In order; a canonicalisation can only be the last (what follows it would need a node set).
+  std::vector<xmlSecTransformId> transforms;
+  std::string inclusivePrefixes;  // of an exclusive canonicalisation transform
   xmlSecTransformId digestMethod;
+  std::vector<unsigned char> digestValue;
 };
 
 struct SignatureDescription {
+  xmlNodePtr signedInfo;
   xmlSecTransformId canonicalizationMethod;
+  std::string inclusivePrefixes;  // of an exclusive canonicalisation method
   SignatureMethod signatureMethod;
   std::vector<ReferenceDescription> references;
+  std::vector<unsigned char> signatureValue;
   // The certificates of ds:KeyInfo/ds:X509Data, in document order; empty without any.
   std::vector<Ref<const Crypto::Certificate>> keyInfoCertificates;
 };

@@ -15,6 +15,11 @@ namespace Security {
 // other (not DER). Raises XmlSecurityException with OpenSSL's reason.
 std::vector<unsigned char> ComputeSignatureValue(EVP_PKEY* key, const EVP_MD* digest, const std::string& data);
 
+// True when `value`, the bytes of a ds:SignatureValue in the form above, is a signature of `data`
+// by the public half of `key` over the hash `digest`. A malformed value is false, not an error.
+bool VerifySignatureValue(EVP_PKEY* key, const EVP_MD* digest, const std::string& data,
+                          const std::vector<unsigned char>& value);
+
 }  // namespace Security
 }  // namespace Xml
 }  // namespace Tamber

@@ -147,9 +147,14 @@ INSTANTIATE_TEST_SUITE_P(
                 "ID \"_a1\" of the signed element is not unique in the document"},
         Refused{"reference-other-id.xml", {"ca"}, VERIFICATION_ERROR,
                 "Reference URI \"#_s1\" does not name the signed element"},
-        Refused{"signature-value-not-base64.xml", {"ca"}, VERIFICATION_ERROR,
-                "Signature cannot be verified: xmlSecBase64CtxDecodeByte: invalid data; invalid data for 'inByte': "
-                "actual=42 and expected base64 character"}),
+        Refused{"transform-after-canonicalization.xml", {"ca"}, SYNTAX_ERROR,
+                "Transform \"http://www.w3.org/2000/09/xmldsig#enveloped-signature\" after a canonicalization is not "
+                "accepted"},
+        Refused{"signature-value-not-base64.xml", {"ca"}, SYNTAX_ERROR,
+                "ds:SignatureValue is not base64: Invalid base64 text: unexpected character 0x2A at offset 0"},
+        Refused{"digest-value-not-base64.xml", {"ca"}, SYNTAX_ERROR,
+                "ds:DigestValue is not base64: Invalid base64 text: unexpected character 0x2A at offset 0"},
+        Refused{"ec-signature-value-truncated.xml", {"ca"}, INVALID, ""}),
     [](const testing::TestParamInfo<Refused>& info) { return "Row" + std::to_string(info.index); });
 
 TEST(SignatureTest, ListsTheReferencesWithTheirUris) {
