@@ -11,6 +11,7 @@
 
 #include "tamber/xml/LibXml.h"
 #include "tamber/xml/security/Algorithms.h"
+#include "tamber/xml/security/ExclusiveCanonicalWriter.h"
 #include "tamber/xml/security/Signature.h"
 
 namespace Tamber {
@@ -71,6 +72,15 @@ std::string CanonicalizeSubtree(xmlNodePtr root, xmlNodePtr excluded, const Cano
                                (errors.HasError() ? errors.GetFirstError() : std::string("unknown error")));
   }
   return text;
+}
+
+std::string CanonicalizeBuiltSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form) {
+  if (IsExclusiveCanonicalization(form.algorithm) && form.inclusivePrefixes.find_first_not_of(" \t\r\n") == std::string::npos) {
+    std::string text;
+    const bool withComments = form.keepComments && CanonicalizationKeepsComments(form.algorithm);
+    if (WriteExclusiveCanonicalForm(root, excluded, withComments, text)) return text;
+  }
+  return CanonicalizeSubtree(root, excluded, form);
 }
 
 std::string InclusivePrefixesOf(xmlNodePtr method) {

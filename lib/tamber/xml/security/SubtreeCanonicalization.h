@@ -23,6 +23,10 @@ struct Canonicalization {
 // namespace nodes, less the subtree of `excluded` (null for none). Raises XmlSecurityException.
 std::string CanonicalizeSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form);
 
+// The same for a tree the layer built itself (to sign it): the exclusive form without inclusive
+// prefixes is written in one walk over the subtree, anything else by CanonicalizeSubtree.
+std::string CanonicalizeBuiltSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form);
+
 // The PrefixList of the InclusiveNamespaces child of a ds:Transform or ds:CanonicalizationMethod
 // element; empty when it has none.
 std::string InclusivePrefixesOf(xmlNodePtr method);

@@ -1,0 +1,201 @@
+#include "tamber/xml/security/ExclusiveCanonicalWriter.h"
+
+#include <algorithm>
+#include <vector>
+
+#include "tamber/xml/security/Ids.h"
+
+namespace Tamber {
+namespace Xml {
+namespace Security {
+
+namespace {
+
+const xmlChar kEmpty[] = "";
+
+const xmlChar* OrEmpty(const xmlChar* text) { return text != nullptr ? text : kEmpty; }
+
+void Append(std::string& out, const xmlChar* text) { out += reinterpret_cast<const char*>(OrEmpty(text)); }
+
+void AppendQName(std::string& out, xmlNsPtr ns, const xmlChar* name) {
+  if (ns != nullptr && ns->prefix != nullptr) {
+    Append(out, ns->prefix);
+    out += ':';
+  }
+  Append(out, name);
+}
+
+// The escape of a character in canonical text (`attribute` false) or attribute values, or null
+// when it stands for itself: text escapes &, <, > and carriage returns; attribute values &, <, ",
+// tab, line feed and carriage return.
+const char* EscapeOf(xmlChar c, bool attribute) {
+  switch (c) {
+    case '&': return "&amp;";
+    case '<': return "&lt;";
+    case '>': return attribute ? nullptr : "&gt;";
+    case '"': return attribute ? "&quot;" : nullptr;
+    case '\t': return attribute ? "&#x9;" : nullptr;
+    case '\n': return attribute ? "&#xA;" : nullptr;
+    case '\r': return "&#xD;";
+    default: return nullptr;
+  }
+}
+
+void AppendEscaped(std::string& out, const xmlChar* text, bool attribute) {
+  const xmlChar* run = OrEmpty(text);  // the start of characters not yet appended
+  for (const xmlChar* c = run; *c != 0; ++c) {
+    if (const char* escape = EscapeOf(*c, attribute)) {
+      out.append(reinterpret_cast<const char*>(run), static_cast<size_t>(c - run));
+      out += escape;
+      run = c + 1;
+    }
+  }
+  out += reinterpret_cast<const char*>(run);
+}
+
+bool NeedsEscaping(const xmlChar* text) {
+  for (const xmlChar* c = OrEmpty(text); *c != 0; ++c) {
+    if (*c == '&' || *c == '<' || *c == '"' || *c == '\t' || *c == '\n' || *c == '\r') return true;
+  }
+  return false;
+}
+
+bool IsXmlNamespace(xmlNsPtr ns) { return xmlStrEqual(ns->href, XML_XML_NAMESPACE); }
+
+struct NamespaceNode {
+  const xmlChar* prefix;  // "" for the default namespace
+  const xmlChar* uri;     // "" for no namespace
+};
+
+class Writer {
+ public:
+  Writer(xmlNodePtr excluded, bool keepComments, std::string& out)
+      : _excluded(excluded), _keepComments(keepComments), _out(out) {}
+
+  bool WriteElement(xmlNodePtr element) {
+    const size_t outerScope = _rendered.size();
+    _out += '<';
+    AppendQName(_out, element->ns, element->name);
+    if (!WriteNamespaces(element)) return false;
+    WriteAttributes(element);
+    _out += '>';
+    for (xmlNodePtr child = element->children; child != nullptr; child = child->next) {
+      if (!WriteChild(child)) return false;
+    }
+    _out += "</";
+    AppendQName(_out, element->ns, element->name);
+    _out += '>';
+    _rendered.resize(outerScope);
+    return true;
+  }
+
+ private:
+  bool WriteChild(xmlNodePtr node) {
+    switch (node->type) {
+      case XML_ELEMENT_NODE:
+        return node == _excluded || WriteElement(node);
+      case XML_TEXT_NODE:
+      case XML_CDATA_SECTION_NODE:
+        AppendEscaped(_out, node->content, false);
+        return true;
+      case XML_COMMENT_NODE:
+        if (_keepComments) {
+          _out += "<!--";
+          Append(_out, node->content);
+          _out += "-->";
+        }
+        return true;
+      case XML_PI_NODE:
+        _out += "<?";
+        Append(_out, node->name);
+        if (node->content != nullptr && *node->content != 0) {
+          _out += ' ';
+          Append(_out, node->content);
+        }
+        _out += "?>";
+        return true;
+      default:
+        return false;
+    }
+  }
+
+  // The namespace URI the nearest output ancestor declared for `prefix`; null when none did.
+  const xmlChar* InEffect(const xmlChar* prefix) const {
+    for (auto node = _rendered.rbegin(); node != _rendered.rend(); ++node) {
+      if (xmlStrEqual(node->prefix, prefix)) return node->uri;
+    }
+    return nullptr;
+  }
+
+  // A namespace the element or one of its attributes uses is declared unless an output ancestor
+  // declared it already; an unqualified element undeclares a default namespace it would inherit.
+  void Utilize(xmlNsPtr ns, std::vector<NamespaceNode>& declarations) const {
+    NamespaceNode node{ns != nullptr ? OrEmpty(ns->prefix) : kEmpty, ns != nullptr ? OrEmpty(ns->href) : kEmpty};
+    for (const NamespaceNode& declared : declarations) {
+      if (xmlStrEqual(declared.prefix, node.prefix)) return;
+    }
+    const xmlChar* inEffect = InEffect(node.prefix);
+    if (inEffect == nullptr ? *node.uri == 0 : xmlStrEqual(inEffect, node.uri)) return;
+    declarations.push_back(node);
+  }
+
+  bool WriteNamespaces(xmlNodePtr element) {
+    std::vector<NamespaceNode> declarations;
+    Utilize(element->ns, declarations);
+    for (xmlAttrPtr attribute = element->properties; attribute != nullptr; attribute = attribute->next) {
+      if (attribute->ns != nullptr && !IsXmlNamespace(attribute->ns)) Utilize(attribute->ns, declarations);
+    }
+    std::sort(declarations.begin(), declarations.end(), [](const NamespaceNode& a, const NamespaceNode& b) {
+      return xmlStrcmp(a.prefix, b.prefix) < 0;
+    });
+    for (const NamespaceNode& declaration : declarations) {
+      if (NeedsEscaping(declaration.uri)) return false;  // libxml2 quotes such URIs its own way
+      _out += " xmlns";
+      if (*declaration.prefix != 0) {
+        _out += ':';
+        Append(_out, declaration.prefix);
+      }
+      _out += "=\"";
+      Append(_out, declaration.uri);
+      _out += '"';
+      _rendered.push_back(declaration);
+    }
+    return true;
+  }
+
+  // Sorted by namespace URI (unqualified first), then by local name.
+  void WriteAttributes(xmlNodePtr element) {
+    std::vector<xmlAttrPtr> attributes;
+    for (xmlAttrPtr attribute = element->properties; attribute != nullptr; attribute = attribute->next) {
+      attributes.push_back(attribute);
+    }
+    std::sort(attributes.begin(), attributes.end(), [](xmlAttrPtr a, xmlAttrPtr b) {
+      int byNamespace = xmlStrcmp(a->ns != nullptr ? a->ns->href : nullptr, b->ns != nullptr ? b->ns->href : nullptr);
+      return byNamespace != 0 ? byNamespace < 0 : xmlStrcmp(a->name, b->name) < 0;
+    });
+    for (xmlAttrPtr attribute : attributes) {
+      _out += ' ';
+      AppendQName(_out, attribute->ns, attribute->name);
+      _out += "=\"";
+      AppendEscaped(_out, BAD_CAST GetAttributeValue(attribute).c_str(), true);
+      _out += '"';
+    }
+  }
+
+  xmlNodePtr const _excluded;
+  const bool _keepComments;
+  std::string& _out;
+  std::vector<NamespaceNode> _rendered;  // declarations of the output ancestors, innermost last
+};
+
+}  // namespace
+
+bool WriteExclusiveCanonicalForm(xmlNodePtr root, xmlNodePtr excluded, bool keepComments, std::string& out) {
+  if (root == excluded) return true;
+  Writer writer(excluded, keepComments, out);
+  return writer.WriteElement(root);
+}
+
+}  // namespace Security
+}  // namespace Xml
+}  // namespace Tamber
