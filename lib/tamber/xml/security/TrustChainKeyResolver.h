@@ -15,7 +15,7 @@ namespace Xml {
 namespace Security {
 
 // Trusts the listed certificates and whatever chains to them. The trust decision is made here with
-// OpenSSL against a store built from the list alone; xmlsec only receives the chosen public key.
+// OpenSSL against a store built from the list alone; the verifier only receives the chosen keys.
 //
 // A library call builds a resolver for every token, so chain verdicts live in a process-wide,
 // bounded cache keyed by the trusted list's fingerprint and the certificates presented: a chain is

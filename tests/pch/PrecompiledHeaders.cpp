@@ -1,0 +1,1 @@
+// The translation unit that compiles the suites' precompiled headers (see tests/CMakeLists.txt).
