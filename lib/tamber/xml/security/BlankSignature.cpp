@@ -146,7 +146,6 @@ class BlankSignature final : public Signature {
     if (node == nullptr) throw XmlSecurityException("Reference \"" + uri + "\" cannot be added");
     Ref<BuiltReference> reference(new BuiltReference(node, uri, DigestAlgorithm(digest)));
     _references.push_back(reference);
-    _builtReferences.push_back(reference);
     return reference.get();
   }
 
@@ -169,12 +168,12 @@ class BlankSignature final : public Signature {
     ResolvePendingNamespaces(_context.get());
     xmlNodePtr context = ToXmlNode(_context.get());
     std::vector<xmlNodePtr> referenced;
-    for (const Ref<BuiltReference>& reference : _builtReferences) {
+    for (const Ref<Reference>& reference : _references) {
       referenced.push_back(FindReferencedAttribute(context, reference->GetURI())->parent);
     }
     TemporaryPlacement placement(_element, context);
     ResolvePendingNamespaces(_element);
-    for (size_t i = 0; i < _builtReferences.size(); ++i) _builtReferences[i]->WriteDigest(referenced[i], _element);
+    for (size_t i = 0; i < _references.size(); ++i) Built(_references[i])->WriteDigest(referenced[i], _element);
     // Canonicalised in its temporary place; the exclusive form, which requests use, comes out the
     // same wherever the caller puts the signature afterwards.
     xmlNodePtr signedInfo = TemplateChild(_element, xmlSecNodeSignedInfo);
@@ -187,6 +186,8 @@ class BlankSignature final : public Signature {
   ElementNode* GetElement() const override { return WrapXmlElement(_element); }
 
  private:
+  static BuiltReference* Built(const Ref<Reference>& reference) { return static_cast<BuiltReference*>(reference.get()); }
+
   // The one ID attribute within the context that "#id" names.
   static xmlAttrPtr FindReferencedAttribute(xmlNodePtr context, const std::string& uri) {
     std::string id = uri.substr(1);
@@ -200,8 +201,7 @@ class BlankSignature final : public Signature {
   xmlNodePtr const _element;
   const xmlSecTransformId _canonicalization;
   const SignatureMethod _method;
-  std::vector<Ref<Reference>> _references;
-  std::vector<Ref<BuiltReference>> _builtReferences;  // the same, with their signing side
+  std::vector<Ref<Reference>> _references;  // each a BuiltReference
 };
 
 }  // namespace
