@@ -78,7 +78,7 @@ class BuiltReference final : public Reference {
         _canonicalizationNode != nullptr
             ? Canonicalization{_canonicalization, false, InclusivePrefixesOf(_canonicalizationNode)}
             : Canonicalization{xmlSecTransformInclC14NId, false, ""};
-    const std::string octets = CanonicalizeBuiltSubtree(referenced, _enveloped ? signature : nullptr, form);
+    const std::string octets = CanonicalizeSubtree(referenced, _enveloped ? signature : nullptr, form);
     std::vector<unsigned char> digest(EVP_MAX_MD_SIZE);
     unsigned int length = 0;
     if (EVP_Digest(octets.data(), octets.size(), digest.data(), &length, _digest, nullptr) != 1) {
@@ -180,7 +180,7 @@ class BlankSignature final : public Signature {
     const Canonicalization form{_canonicalization, true,
                                 InclusivePrefixesOf(TemplateChild(signedInfo, xmlSecNodeCanonicalizationMethod))};
     SetBase64Content(TemplateChild(_element, xmlSecNodeSignatureValue),
-                     ComputeSignatureValue(pkey, _method.digest, CanonicalizeBuiltSubtree(signedInfo, nullptr, form)));
+                     ComputeSignatureValue(pkey, _method.digest, CanonicalizeSubtree(signedInfo, nullptr, form)));
   }
 
   ElementNode* GetElement() const override { return WrapXmlElement(_element); }

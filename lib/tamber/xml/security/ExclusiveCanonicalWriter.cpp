@@ -53,11 +53,21 @@ void AppendEscaped(std::string& out, const xmlChar* text, bool attribute) {
   out += reinterpret_cast<const char*>(run);
 }
 
-bool NeedsEscaping(const xmlChar* text) {
-  for (const xmlChar* c = OrEmpty(text); *c != 0; ++c) {
-    if (*c == '&' || *c == '<' || *c == '"' || *c == '\t' || *c == '\n' || *c == '\r') return true;
+bool IsAsciiLetter(xmlChar c) { return (c >= 'a' && c <= 'z') || (c >= 'A' && c <= 'Z'); }
+
+// A namespace URI is written as it stands when it is absolute (libxml2 refuses relative ones) and
+// holds only printable ASCII that needs no escaping (libxml2 refuses what is no URI, and quotes
+// the rest its own way). Anything else is left to libxml2.
+bool IsPlainAbsoluteUri(const xmlChar* uri) {
+  if (uri == nullptr || *uri == 0) return true;  // no namespace
+  if (!IsAsciiLetter(*uri)) return false;
+  const xmlChar* c = uri + 1;
+  while (IsAsciiLetter(*c) || (*c >= '0' && *c <= '9') || *c == '+' || *c == '-' || *c == '.') ++c;
+  if (*c != ':') return false;
+  for (; *c != 0; ++c) {
+    if (*c <= 0x20 || *c >= 0x7F || *c == '"' || *c == '&' || *c == '<' || *c == '>') return false;
   }
-  return false;
+  return true;
 }
 
 bool IsXmlNamespace(xmlNsPtr ns) { return xmlStrEqual(ns->href, XML_XML_NAMESPACE); }
@@ -69,10 +79,13 @@ struct NamespaceNode {
 
 class Writer {
  public:
-  Writer(xmlNodePtr excluded, bool keepComments, std::string& out)
-      : _excluded(excluded), _keepComments(keepComments), _out(out) {}
+  Writer(xmlNodePtr excluded, bool keepComments, const std::vector<std::string>& inclusivePrefixes, std::string& out)
+      : _excluded(excluded), _keepComments(keepComments), _inclusivePrefixes(inclusivePrefixes), _out(out) {}
 
   bool WriteElement(xmlNodePtr element) {
+    for (xmlNsPtr declared = element->nsDef; declared != nullptr; declared = declared->next) {
+      if (!IsPlainAbsoluteUri(declared->href)) return false;
+    }
     const size_t outerScope = _rendered.size();
     _out += '<';
     AppendQName(_out, element->ns, element->name);
@@ -127,9 +140,11 @@ class Writer {
     return nullptr;
   }
 
-  // A namespace the element or one of its attributes uses is declared unless an output ancestor
-  // declared it already; an unqualified element undeclares a default namespace it would inherit.
+  // A namespace the element or one of its attributes uses, or one in scope whose prefix is listed
+  // as inclusive, is declared unless an output ancestor declared it already; an unqualified
+  // element undeclares a default namespace it would inherit. The xml prefix is never declared.
   void Utilize(xmlNsPtr ns, std::vector<NamespaceNode>& declarations) const {
+    if (ns != nullptr && IsXmlNamespace(ns)) return;
     NamespaceNode node{ns != nullptr ? OrEmpty(ns->prefix) : kEmpty, ns != nullptr ? OrEmpty(ns->href) : kEmpty};
     for (const NamespaceNode& declared : declarations) {
       if (xmlStrEqual(declared.prefix, node.prefix)) return;
@@ -141,15 +156,20 @@ class Writer {
 
   bool WriteNamespaces(xmlNodePtr element) {
     std::vector<NamespaceNode> declarations;
-    Utilize(element->ns, declarations);
+    // An unqualified element uses the default namespace in scope: in a parsed tree an undeclaration,
+    // in a built one possibly a declaration its serialisation will put it under.
+    Utilize(element->ns != nullptr ? element->ns : xmlSearchNs(element->doc, element, nullptr), declarations);
     for (xmlAttrPtr attribute = element->properties; attribute != nullptr; attribute = attribute->next) {
-      if (attribute->ns != nullptr && !IsXmlNamespace(attribute->ns)) Utilize(attribute->ns, declarations);
+      if (attribute->ns != nullptr) Utilize(attribute->ns, declarations);
+    }
+    for (const std::string& prefix : _inclusivePrefixes) {
+      if (xmlNsPtr inScope = xmlSearchNs(element->doc, element, BAD_CAST prefix.c_str())) Utilize(inScope, declarations);
     }
     std::sort(declarations.begin(), declarations.end(), [](const NamespaceNode& a, const NamespaceNode& b) {
       return xmlStrcmp(a.prefix, b.prefix) < 0;
     });
     for (const NamespaceNode& declaration : declarations) {
-      if (NeedsEscaping(declaration.uri)) return false;  // libxml2 quotes such URIs its own way
+      if (!IsPlainAbsoluteUri(declaration.uri)) return false;
       _out += " xmlns";
       if (*declaration.prefix != 0) {
         _out += ':';
@@ -184,15 +204,20 @@ class Writer {
 
   xmlNodePtr const _excluded;
   const bool _keepComments;
+  const std::vector<std::string>& _inclusivePrefixes;
   std::string& _out;
   std::vector<NamespaceNode> _rendered;  // declarations of the output ancestors, innermost last
 };
 
 }  // namespace
 
-bool WriteExclusiveCanonicalForm(xmlNodePtr root, xmlNodePtr excluded, bool keepComments, std::string& out) {
+bool WriteExclusiveCanonicalForm(xmlNodePtr root, xmlNodePtr excluded, bool keepComments,
+                                 const std::vector<std::string>& inclusivePrefixes, std::string& out) {
+  for (const std::string& prefix : inclusivePrefixes) {
+    if (prefix == "#default") return false;  // the default namespace as inclusive: libxml2's rules
+  }
   if (root == excluded) return true;
-  Writer writer(excluded, keepComments, out);
+  Writer writer(excluded, keepComments, inclusivePrefixes, out);
   return writer.WriteElement(root);
 }
 

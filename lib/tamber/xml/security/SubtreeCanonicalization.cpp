@@ -1,5 +1,6 @@
 #include "tamber/xml/security/SubtreeCanonicalization.h"
 
+#include <algorithm>
 #include <vector>
 
 #include <boost/algorithm/string/classification.hpp>
@@ -48,17 +49,22 @@ int AppendToString(void* context, const char* buffer, int length) {
 
 }  // namespace
 
-std::string CanonicalizeSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form) {
+std::vector<std::string> SplitPrefixList(const std::string& list) {
+  std::vector<std::string> prefixes;
+  boost::split(prefixes, list, boost::is_any_of(" \t\r\n"), boost::token_compress_on);
+  prefixes.erase(std::remove(prefixes.begin(), prefixes.end(), std::string()), prefixes.end());
+  return prefixes;
+}
+
+std::string CanonicalizeSubtreeWithLibXml2(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form) {
   NodeSet nodes{root, excluded};
   const bool exclusive = IsExclusiveCanonicalization(form.algorithm);
   const int mode = exclusive ? XML_C14N_EXCLUSIVE_1_0 : XML_C14N_1_0;
   const int withComments = form.keepComments && CanonicalizationKeepsComments(form.algorithm) ? 1 : 0;
   std::vector<std::string> prefixes;
-  if (exclusive) boost::split(prefixes, form.inclusivePrefixes, boost::is_any_of(" \t\r\n"), boost::token_compress_on);
+  if (exclusive) prefixes = SplitPrefixList(form.inclusivePrefixes);
   std::vector<xmlChar*> prefixList;
-  for (std::string& prefix : prefixes) {
-    if (!prefix.empty()) prefixList.push_back(BAD_CAST &prefix[0]);
-  }
+  for (std::string& prefix : prefixes) prefixList.push_back(BAD_CAST &prefix[0]);
   prefixList.push_back(nullptr);
   std::string text;
   ScopedXmlErrorCapture errors;
@@ -74,13 +80,15 @@ std::string CanonicalizeSubtree(xmlNodePtr root, xmlNodePtr excluded, const Cano
   return text;
 }
 
-std::string CanonicalizeBuiltSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form) {
-  if (IsExclusiveCanonicalization(form.algorithm) && form.inclusivePrefixes.find_first_not_of(" \t\r\n") == std::string::npos) {
+std::string CanonicalizeSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form) {
+  if (IsExclusiveCanonicalization(form.algorithm)) {
     std::string text;
     const bool withComments = form.keepComments && CanonicalizationKeepsComments(form.algorithm);
-    if (WriteExclusiveCanonicalForm(root, excluded, withComments, text)) return text;
+    if (WriteExclusiveCanonicalForm(root, excluded, withComments, SplitPrefixList(form.inclusivePrefixes), text)) {
+      return text;
+    }
   }
-  return CanonicalizeSubtree(root, excluded, form);
+  return CanonicalizeSubtreeWithLibXml2(root, excluded, form);
 }
 
 std::string InclusivePrefixesOf(xmlNodePtr method) {

@@ -1,9 +1,10 @@
 #ifndef TAMBER_XML_SECURITY_SUBTREECANONICALIZATION_H
 #define TAMBER_XML_SECURITY_SUBTREECANONICALIZATION_H
 
-// Canonical form of one subtree of a tree, made in place by libxml2 (no copy of the document).
+// Canonical form of one subtree of a tree, made in place (no copy of the document).
 
 #include <string>
+#include <vector>
 
 #include <libxml/tree.h>
 #include <xmlsec/transforms.h>
@@ -20,12 +21,17 @@ struct Canonicalization {
 };
 
 // The canonical form of the node set made of `root`, its descendants, their attributes and
-// namespace nodes, less the subtree of `excluded` (null for none). Raises XmlSecurityException.
+// namespace nodes, less the subtree of `excluded` (null for none). The exclusive form is written
+// in one walk over the subtree (ExclusiveCanonicalWriter.h) unless it holds something only libxml2
+// handles; the inclusive form always comes from libxml2. Raises XmlSecurityException.
 std::string CanonicalizeSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form);
 
-// The same for a tree the layer built itself (to sign it): the exclusive form without inclusive
-// prefixes is written in one walk over the subtree, anything else by CanonicalizeSubtree.
-std::string CanonicalizeBuiltSubtree(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form);
+// The same, always by libxml2's C14N over the whole document with a node-set callback: the
+// reference the writer is held to.
+std::string CanonicalizeSubtreeWithLibXml2(xmlNodePtr root, xmlNodePtr excluded, const Canonicalization& form);
+
+// The prefixes of an InclusiveNamespaces PrefixList, in order, without empty entries.
+std::vector<std::string> SplitPrefixList(const std::string& list);
 
 // The PrefixList of the InclusiveNamespaces child of a ds:Transform or ds:CanonicalizationMethod
 // element; empty when it has none.
