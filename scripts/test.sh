@@ -39,6 +39,7 @@ for suite in "${concurrent_suites[@]}"; do
     --gtest_filter='-*SizeLimit*:*Oversized*'
 done
 
-echo "== Fuzzing the token parser for 60 seconds ($(date +%T))"
-bash scripts/fuzz.sh 60
+echo "== Fuzzing the token parser for 60 seconds, the canonicalisation for 30 ($(date +%T))"
+bash scripts/fuzz.sh 60 SamlTokenFuzz
+bash scripts/fuzz.sh 30 ExclusiveCanonicalFuzz
 echo "== All passed ($(date +%T))"
