@@ -143,32 +143,32 @@ class Writer {
   // A namespace the element or one of its attributes uses, or one in scope whose prefix is listed
   // as inclusive, is declared unless an output ancestor declared it already; an unqualified
   // element undeclares a default namespace it would inherit. The xml prefix is never declared.
-  void Utilize(xmlNsPtr ns, std::vector<NamespaceNode>& declarations) const {
+  void Utilize(xmlNsPtr ns) {
     if (ns != nullptr && IsXmlNamespace(ns)) return;
     NamespaceNode node{ns != nullptr ? OrEmpty(ns->prefix) : kEmpty, ns != nullptr ? OrEmpty(ns->href) : kEmpty};
-    for (const NamespaceNode& declared : declarations) {
+    for (const NamespaceNode& declared : _declarations) {
       if (xmlStrEqual(declared.prefix, node.prefix)) return;
     }
     const xmlChar* inEffect = InEffect(node.prefix);
     if (inEffect == nullptr ? *node.uri == 0 : xmlStrEqual(inEffect, node.uri)) return;
-    declarations.push_back(node);
+    _declarations.push_back(node);
   }
 
   bool WriteNamespaces(xmlNodePtr element) {
-    std::vector<NamespaceNode> declarations;
+    _declarations.clear();
     // An unqualified element uses the default namespace in scope: in a parsed tree an undeclaration,
     // in a built one possibly a declaration its serialisation will put it under.
-    Utilize(element->ns != nullptr ? element->ns : xmlSearchNs(element->doc, element, nullptr), declarations);
+    Utilize(element->ns != nullptr ? element->ns : xmlSearchNs(element->doc, element, nullptr));
     for (xmlAttrPtr attribute = element->properties; attribute != nullptr; attribute = attribute->next) {
-      if (attribute->ns != nullptr) Utilize(attribute->ns, declarations);
+      if (attribute->ns != nullptr) Utilize(attribute->ns);
     }
     for (const std::string& prefix : _inclusivePrefixes) {
-      if (xmlNsPtr inScope = xmlSearchNs(element->doc, element, BAD_CAST prefix.c_str())) Utilize(inScope, declarations);
+      if (xmlNsPtr inScope = xmlSearchNs(element->doc, element, BAD_CAST prefix.c_str())) Utilize(inScope);
     }
-    std::sort(declarations.begin(), declarations.end(), [](const NamespaceNode& a, const NamespaceNode& b) {
+    std::sort(_declarations.begin(), _declarations.end(), [](const NamespaceNode& a, const NamespaceNode& b) {
       return xmlStrcmp(a.prefix, b.prefix) < 0;
     });
-    for (const NamespaceNode& declaration : declarations) {
+    for (const NamespaceNode& declaration : _declarations) {
       if (!IsPlainAbsoluteUri(declaration.uri)) return false;
       _out += " xmlns";
       if (*declaration.prefix != 0) {
@@ -185,19 +185,24 @@ class Writer {
 
   // Sorted by namespace URI (unqualified first), then by local name.
   void WriteAttributes(xmlNodePtr element) {
-    std::vector<xmlAttrPtr> attributes;
+    _attributes.clear();
     for (xmlAttrPtr attribute = element->properties; attribute != nullptr; attribute = attribute->next) {
-      attributes.push_back(attribute);
+      _attributes.push_back(attribute);
     }
-    std::sort(attributes.begin(), attributes.end(), [](xmlAttrPtr a, xmlAttrPtr b) {
+    std::sort(_attributes.begin(), _attributes.end(), [](xmlAttrPtr a, xmlAttrPtr b) {
       int byNamespace = xmlStrcmp(a->ns != nullptr ? a->ns->href : nullptr, b->ns != nullptr ? b->ns->href : nullptr);
       return byNamespace != 0 ? byNamespace < 0 : xmlStrcmp(a->name, b->name) < 0;
     });
-    for (xmlAttrPtr attribute : attributes) {
+    for (xmlAttrPtr attribute : _attributes) {
       _out += ' ';
       AppendQName(_out, attribute->ns, attribute->name);
       _out += "=\"";
-      AppendEscaped(_out, BAD_CAST GetAttributeValue(attribute).c_str(), true);
+      xmlNodePtr value = attribute->children;
+      if (value != nullptr && value->next == nullptr && value->type == XML_TEXT_NODE) {
+        AppendEscaped(_out, value->content, true);  // as parsed: one text node
+      } else {
+        AppendEscaped(_out, BAD_CAST GetAttributeValue(attribute).c_str(), true);
+      }
       _out += '"';
     }
   }
@@ -207,6 +212,9 @@ class Writer {
   const std::vector<std::string>& _inclusivePrefixes;
   std::string& _out;
   std::vector<NamespaceNode> _rendered;  // declarations of the output ancestors, innermost last
+  // Scratch space of the element being written, reused (its children are written afterwards).
+  std::vector<NamespaceNode> _declarations;
+  std::vector<xmlAttrPtr> _attributes;
 };
 
 }  // namespace
