@@ -14,6 +14,7 @@
 #include "tamber/xml/NodeImpl.h"
 #include "tamber/xml/security/Algorithms.h"
 #include "tamber/xml/security/Ids.h"
+#include "tamber/xml/security/ReferenceDigest.h"
 #include "tamber/xml/security/Signature.h"
 #include "tamber/xml/security/SignatureSyntax.h"
 #include "tamber/xml/security/SignatureValue.h"
@@ -57,44 +58,29 @@ class BuiltReference final : public Reference {
       throw InvalidArgumentException("Unsupported transform \"" + algorithmUri + "\"");
     }
     // Canonicalisation turns the node set into octets: nothing can be taken out of it afterwards.
-    if (_canonicalization != xmlSecTransformIdUnknown) {
+    if (!_transforms.empty() && _transforms.back() != xmlSecTransformEnvelopedId) {
       throw InvalidArgumentException("Transform \"" + algorithmUri +
                                      "\" cannot follow a canonicalization; expected it to be the last transform");
     }
     xmlNodePtr node = xmlSecTmplReferenceAddTransform(_node, transform);
     if (node == nullptr) throw XmlSecurityException("Transform \"" + algorithmUri + "\" cannot be added");
-    if (transform == xmlSecTransformEnvelopedId) {
-      _enveloped = true;
-    } else {
-      _canonicalization = transform;
-      _canonicalizationNode = node;
-    }
+    _transforms.push_back(transform);
+    if (transform != xmlSecTransformEnvelopedId) _canonicalizationNode = node;
   }
 
-  // Writes the digest of `referenced` into ds:DigestValue. Without a canonicalisation the node
-  // set is canonicalised inclusively; a bare-name reference never includes comments.
+  // Writes the digest of `referenced` into ds:DigestValue.
   void WriteDigest(xmlNodePtr referenced, xmlNodePtr signature) const {
-    const Canonicalization form =
-        _canonicalizationNode != nullptr
-            ? Canonicalization{_canonicalization, false, InclusivePrefixesOf(_canonicalizationNode)}
-            : Canonicalization{xmlSecTransformInclC14NId, false, ""};
-    const std::string octets = CanonicalizeSubtree(referenced, _enveloped ? signature : nullptr, form);
-    std::vector<unsigned char> digest(EVP_MAX_MD_SIZE);
-    unsigned int length = 0;
-    if (EVP_Digest(octets.data(), octets.size(), digest.data(), &length, _digest, nullptr) != 1) {
-      throw XmlSecurityException("Digest of \"" + _uri + "\" failed: " + Crypto::TakeOpenSslError());
-    }
-    digest.resize(length);
-    SetBase64Content(TemplateChild(_node, xmlSecNodeDigestValue), digest);
+    const std::string prefixes = _canonicalizationNode != nullptr ? InclusivePrefixesOf(_canonicalizationNode) : "";
+    SetBase64Content(TemplateChild(_node, xmlSecNodeDigestValue),
+                     ComputeReferenceDigest(referenced, signature, _transforms, prefixes, _digest, _uri));
   }
 
  private:
   xmlNodePtr const _node;  // the ds:Reference, owned by the signature's element
   const std::string _uri;
   const EVP_MD* const _digest;
-  xmlSecTransformId _canonicalization = xmlSecTransformIdUnknown;
+  std::vector<xmlSecTransformId> _transforms;  // in order, a canonicalisation only last
   xmlNodePtr _canonicalizationNode = nullptr;  // its ds:Transform, which may name inclusive prefixes
-  bool _enveloped = false;
 };
 
 // Links the signature's element, while it is in no tree, as the last child of the context for the

@@ -8,6 +8,7 @@
 #include "tamber/crypto/OpenSsl.h"
 #include "tamber/xml/LibXml.h"
 #include "tamber/xml/security/Ids.h"
+#include "tamber/xml/security/ReferenceDigest.h"
 #include "tamber/xml/security/Signature.h"
 #include "tamber/xml/security/SignatureSyntax.h"
 #include "tamber/xml/security/SignatureValue.h"
@@ -32,30 +33,12 @@ class ParsedReference final : public Reference {
   const std::string _uri;
 };
 
-// The bytes a reference's digest covers: the signed element, less the ds:Signature when the
-// reference has the enveloped-signature transform, canonicalised by its last transform (inclusive
-// Canonical XML 1.0 when it has none). Same-document references select no comments.
-std::string ReferencedBytes(xmlNodePtr signedNode, xmlNodePtr signatureNode, const ReferenceDescription& reference) {
-  Canonicalization form{xmlSecTransformInclC14NId, false, ""};
-  xmlNodePtr excluded = nullptr;
-  for (xmlSecTransformId transform : reference.transforms) {
-    if (transform == xmlSecTransformEnvelopedId) {
-      excluded = signatureNode;
-    } else {
-      form.algorithm = transform;
-      form.inclusivePrefixes = reference.inclusivePrefixes;
-    }
-  }
-  return CanonicalizeSubtree(signedNode, excluded, form);
-}
-
-bool DigestMatches(const std::string& bytes, const ReferenceDescription& reference) {
-  unsigned char digest[EVP_MAX_MD_SIZE];
-  unsigned int length = 0;
-  if (EVP_Digest(bytes.data(), bytes.size(), digest, &length, DigestAlgorithm(reference.digestMethod), nullptr) != 1) {
-    throw XmlSecurityException("Digest failed: " + Crypto::TakeOpenSslError());
-  }
-  return length == reference.digestValue.size() && CRYPTO_memcmp(digest, reference.digestValue.data(), length) == 0;
+bool DigestMatches(xmlNodePtr signedNode, xmlNodePtr signatureNode, const ReferenceDescription& reference) {
+  const std::vector<unsigned char> digest =
+      ComputeReferenceDigest(signedNode, signatureNode, reference.transforms, reference.inclusivePrefixes,
+                             DigestAlgorithm(reference.digestMethod), reference.uri);
+  return digest.size() == reference.digestValue.size() &&
+         CRYPTO_memcmp(digest.data(), reference.digestValue.data(), digest.size()) == 0;
 }
 
 // A signature read from a document, to be verified on its signed element alone.
@@ -81,9 +64,7 @@ class ParsedSignature final : public Signature {
     std::vector<Ref<const Crypto::Certificate>> keys = trust->SelectCertificates(_description.keyInfoCertificates);
     if (keys.empty() || !SignedInfoVerifies(keys)) return false;
     for (const ReferenceDescription& reference : _description.references) {
-      if (!DigestMatches(ReferencedBytes(signedNode, ToXmlNode(_signatureElement.get()), reference), reference)) {
-        return false;
-      }
+      if (!DigestMatches(signedNode, ToXmlNode(_signatureElement.get()), reference)) return false;
     }
     verifiedElements.assign(1, _signedElement.get());
     return true;

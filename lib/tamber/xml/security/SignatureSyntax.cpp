@@ -6,6 +6,7 @@
 
 #include "tamber/StringUtil.h"
 #include "tamber/xml/security/Signature.h"
+#include "tamber/xml/security/SubtreeCanonicalization.h"
 
 namespace Tamber {
 namespace Xml {
@@ -96,10 +97,7 @@ std::string ReadCanonicalizationParameters(xmlNodePtr element, xmlSecTransformId
     RefuseUnexpected(inclusive, element);
   }
   ExpectEnd(children);
-  xmlChar* list = xmlGetNoNsProp(inclusive, xmlSecAttrPrefixList);
-  std::string prefixes = Text(list);
-  xmlFree(list);
-  return prefixes;
+  return InclusivePrefixesOf(element);
 }
 
 void ReadCanonicalizationMethod(xmlNodePtr element, SignatureDescription& description) {
