@@ -26,6 +26,9 @@ CliError::CliError(const std::string& className, ExitCode code, const std::strin
 
 TimeoutError::TimeoutError(const std::string& message) : CliError("TimeoutError", EXIT_CODE_COMMUNICATION, message) {}
 
+namespace {
+
+// The exit code for a failure of the tool or of the library.
 ExitCode ExitCodeOf(const std::exception& error) {
   if (auto cliError = dynamic_cast<const CliError*>(&error)) return cliError->GetCode();
   if (dynamic_cast<const SsoClient::InvalidCredentialsException*>(&error)) return EXIT_CODE_BAD_CREDENTIALS;
@@ -37,6 +40,8 @@ ExitCode ExitCodeOf(const std::exception& error) {
   if (dynamic_cast<const Tamber::InvalidArgumentException*>(&error)) return EXIT_CODE_USAGE;
   return EXIT_CODE_OTHER;
 }
+
+}  // namespace
 
 std::string ClassNameOf(const std::exception& error) {
   if (auto cliError = dynamic_cast<const CliError*>(&error)) return cliError->GetClassName();

@@ -42,8 +42,6 @@ class TimeoutError : public CliError {
   explicit TimeoutError(const std::string& message);
 };
 
-// The exit code for a failure of the tool or of the library.
-ExitCode ExitCodeOf(const std::exception& error);
 // The class shown for a failure: the library's qualified class name, or the tool's own.
 std::string ClassNameOf(const std::exception& error);
 // Writes "ssoclient: <class>: <message>" as one line (line breaks in the message become spaces).

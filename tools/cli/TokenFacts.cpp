@@ -11,6 +11,14 @@ namespace {
 
 using nlohmann::json;
 
+// "name@domain".
+std::string FormatPrincipal(const SsoClient::PrincipalId& principal) { return principal.name + "@" + principal.domain; }
+
+// "bearer" or "holder-of-key".
+std::string FormatConfirmation(const SsoClient::SamlToken& token) {
+  return token.GetConfirmationMethod() == SsoClient::SamlToken::CONFIRM_HOLDER_OF_KEY ? "holder-of-key" : "bearer";
+}
+
 std::vector<std::string> Groups(const SsoClient::SamlToken& token) {
   std::vector<SsoClient::PrincipalId> groups;
   token.GetGroups(groups);
@@ -78,12 +86,6 @@ std::string FullName(const SsoClient::SamlToken& token) {
 const char* YesNo(bool value) { return value ? "yes" : "no"; }
 
 }  // namespace
-
-std::string FormatPrincipal(const SsoClient::PrincipalId& principal) { return principal.name + "@" + principal.domain; }
-
-std::string FormatConfirmation(const SsoClient::SamlToken& token) {
-  return token.GetConfirmationMethod() == SsoClient::SamlToken::CONFIRM_HOLDER_OF_KEY ? "holder-of-key" : "bearer";
-}
 
 std::string TokenSummary(const SsoClient::SamlToken& token) {
   std::string summary = "subject " + FormatPrincipal(token.GetSubject()) + "; groups " + ListOrNone(Groups(token)) +

@@ -12,11 +12,6 @@
 
 namespace Cli {
 
-// "name@domain".
-std::string FormatPrincipal(const SsoClient::PrincipalId& principal);
-// "bearer" or "holder-of-key".
-std::string FormatConfirmation(const SsoClient::SamlToken& token);
-
 // The facts that tell tokens apart, on one line: subject, groups, validity, confirmation and
 // delegation chain.
 std::string TokenSummary(const SsoClient::SamlToken& token);

@@ -12,12 +12,14 @@
 namespace Cli {
 namespace {
 
+CliError WriteError(const std::string& path, const std::string& reason) {
+  return CliError("FileError", EXIT_CODE_OTHER, "file '" + path + "': cannot be written: " + reason);
+}
+
 // A token is a credential: the file is created for its owner alone.
 void WriteSecretFile(const std::string& path, const std::string& text) {
   const int fd = open(path.c_str(), O_WRONLY | O_CREAT | O_TRUNC | O_CLOEXEC, 0600);
-  if (fd < 0) {
-    throw CliError("FileError", EXIT_CODE_OTHER, "file '" + path + "': cannot be written: " + std::strerror(errno));
-  }
+  if (fd < 0) throw WriteError(path, std::strerror(errno));
   size_t written = 0;
   while (written < text.size()) {
     const ssize_t count = write(fd, text.data() + written, text.size() - written);
@@ -25,13 +27,11 @@ void WriteSecretFile(const std::string& path, const std::string& text) {
     if (count <= 0) {
       const std::string reason = std::strerror(errno);
       close(fd);
-      throw CliError("FileError", EXIT_CODE_OTHER, "file '" + path + "': cannot be written: " + reason);
+      throw WriteError(path, reason);
     }
     written += static_cast<size_t>(count);
   }
-  if (close(fd) != 0) {
-    throw CliError("FileError", EXIT_CODE_OTHER, "file '" + path + "': cannot be written: " + std::strerror(errno));
-  }
+  if (close(fd) != 0) throw WriteError(path, std::strerror(errno));
 }
 
 }  // namespace

@@ -27,24 +27,38 @@ std::string ReadTextFile(const std::string& path) {
   return content.str();
 }
 
-Tamber::Ref<const Tamber::Crypto::Certificate> ReadCertificate(const std::string& path) {
-  Tamber::Ref<const Tamber::Crypto::Certificate> certificate;
+namespace {
+
+// What `create` makes of `pem`; std::runtime_error "`expected`: <reason>" when it fails.
+template <class T>
+Tamber::Ref<const T> ParsePem(const std::string& pem, const std::string& expected,
+                              void (*create)(const std::string&, Tamber::Ref<const T>&)) {
+  Tamber::Ref<const T> parsed;
   try {
-    Tamber::Crypto::CreateCertificateFromPem(ReadTextFile(path), certificate);
+    create(pem, parsed);
   } catch (const Tamber::Exception& e) {
-    throw std::runtime_error("Expected a PEM certificate in " + path + ": " + e.what());
+    throw std::runtime_error(expected + ": " + e.what());
   }
-  return certificate;
+  return parsed;
+}
+
+}  // namespace
+
+Tamber::Ref<const Tamber::Crypto::Certificate> ParseCertificatePem(const std::string& pem,
+                                                                   const std::string& expected) {
+  return ParsePem<Tamber::Crypto::Certificate>(pem, expected, &Tamber::Crypto::CreateCertificateFromPem);
+}
+
+Tamber::Ref<const Tamber::Crypto::PrivateKey> ParsePrivateKeyPem(const std::string& pem, const std::string& expected) {
+  return ParsePem<Tamber::Crypto::PrivateKey>(pem, expected, &Tamber::Crypto::CreatePrivateKeyFromPem);
+}
+
+Tamber::Ref<const Tamber::Crypto::Certificate> ReadCertificate(const std::string& path) {
+  return ParseCertificatePem(ReadTextFile(path), "Expected a PEM certificate in " + path);
 }
 
 Tamber::Ref<const Tamber::Crypto::PrivateKey> ReadPrivateKey(const std::string& path) {
-  Tamber::Ref<const Tamber::Crypto::PrivateKey> key;
-  try {
-    Tamber::Crypto::CreatePrivateKeyFromPem(ReadTextFile(path), key);
-  } catch (const Tamber::Exception& e) {
-    throw std::runtime_error("Expected a PEM private key in " + path + ": " + e.what());
-  }
-  return key;
+  return ParsePrivateKeyPem(ReadTextFile(path), "Expected a PEM private key in " + path);
 }
 
 }  // namespace DevSts

@@ -15,6 +15,10 @@ namespace DevSts {
 std::string KeyPath(const std::string& directory, const std::string& fileName);
 // The whole content of a file; std::runtime_error naming the file when it cannot be read.
 std::string ReadTextFile(const std::string& path);
+// `pem` decoded; std::runtime_error "`expected`: <reason>" when it holds no such object.
+Tamber::Ref<const Tamber::Crypto::Certificate> ParseCertificatePem(const std::string& pem,
+                                                                   const std::string& expected);
+Tamber::Ref<const Tamber::Crypto::PrivateKey> ParsePrivateKeyPem(const std::string& pem, const std::string& expected);
 Tamber::Ref<const Tamber::Crypto::Certificate> ReadCertificate(const std::string& path);
 Tamber::Ref<const Tamber::Crypto::PrivateKey> ReadPrivateKey(const std::string& path);
 

@@ -15,6 +15,7 @@
 
 #include "DevSts.h"
 #include "KeyDirectory.h"
+#include "tamber/crypto/OpenSsl.h"
 
 namespace DevSts {
 
@@ -23,15 +24,8 @@ namespace {
 // Development keys last long enough never to expire under a demo or a test run.
 const long VALIDITY_SECONDS = 10L * 365 * 24 * 3600;
 
-struct OpenSslDeleter {
-  void operator()(EVP_PKEY* key) const { EVP_PKEY_free(key); }
-  void operator()(X509* certificate) const { X509_free(certificate); }
-  void operator()(X509_NAME* name) const { X509_NAME_free(name); }
-  void operator()(X509_EXTENSION* extension) const { X509_EXTENSION_free(extension); }
-  void operator()(BIO* bio) const { BIO_free(bio); }
-};
-using Key = std::unique_ptr<EVP_PKEY, OpenSslDeleter>;
-using Certificate = std::unique_ptr<X509, OpenSslDeleter>;
+using Key = Tamber::Crypto::EvpPkeyPtr;
+using Certificate = Tamber::Crypto::X509Ptr;
 
 void Require(bool ok, const std::string& what) {
   if (!ok) throw std::runtime_error("Key generation failed: " + what);
@@ -47,7 +41,8 @@ void AddExtension(X509* certificate, X509* issuer, int nid, const char* value) {
   X509V3_CTX context;
   X509V3_set_ctx_nodb(&context);
   X509V3_set_ctx(&context, issuer, certificate, nullptr, nullptr, 0);
-  std::unique_ptr<X509_EXTENSION, OpenSslDeleter> extension(X509V3_EXT_conf_nid(nullptr, &context, nid, value));
+  const std::unique_ptr<X509_EXTENSION, decltype(&X509_EXTENSION_free)> extension(
+      X509V3_EXT_conf_nid(nullptr, &context, nid, value), &X509_EXTENSION_free);
   Require(extension && X509_add_ext(certificate, extension.get(), -1) == 1, std::string("extension ") + value);
 }
 
@@ -60,10 +55,9 @@ Certificate NewCertificate(EVP_PKEY* key, const std::string& commonName, X509* i
   unsigned char serial[16];
   Require(RAND_bytes(serial, sizeof serial) == 1, "serial number");
   serial[0] &= 0x7f;  // positive
-  BIGNUM* number = BN_bin2bn(serial, sizeof serial, nullptr);
-  Require(number != nullptr && BN_to_ASN1_INTEGER(number, X509_get_serialNumber(certificate.get())) != nullptr,
+  const std::unique_ptr<BIGNUM, decltype(&BN_free)> number(BN_bin2bn(serial, sizeof serial, nullptr), &BN_free);
+  Require(number != nullptr && BN_to_ASN1_INTEGER(number.get(), X509_get_serialNumber(certificate.get())) != nullptr,
           "serial number");
-  BN_free(number);
   X509_gmtime_adj(X509_getm_notBefore(certificate.get()), -3600);
   X509_gmtime_adj(X509_getm_notAfter(certificate.get()), VALIDITY_SECONDS);
   X509_NAME* name = X509_get_subject_name(certificate.get());
@@ -90,7 +84,7 @@ void Sign(X509* certificate, EVP_PKEY* issuerKey) {
 }
 
 void WriteFile(const std::string& path, bool secret, const std::function<int(BIO*)>& write) {
-  std::unique_ptr<BIO, OpenSslDeleter> bio(BIO_new_file(path.c_str(), "w"));
+  const Tamber::Crypto::BioPtr bio(BIO_new_file(path.c_str(), "w"));
   Require(bio != nullptr, "cannot write " + path);
   if (secret) chmod(path.c_str(), S_IRUSR | S_IWUSR);
   Require(write(bio.get()) == 1, "cannot write " + path);

@@ -1,6 +1,7 @@
 #include "RequestSignature.h"
 
 #include <memory>
+#include <string>
 
 #include <libxml/valid.h>
 #include <xmlsec/app.h>
@@ -8,6 +9,8 @@
 #include <xmlsec/xmldsig.h>
 
 #include "ssoClient/WireConstants.h"
+#include "tamber/xml/TreeWalk.h"
+#include "tamber/xml/security/Ids.h"
 #include "tamber/xml/security/XmlSec.h"
 
 namespace DevSts {
@@ -20,27 +23,23 @@ struct ContextDeleter {
 
 const xmlChar* Chars(const char* text) { return reinterpret_cast<const xmlChar*>(text); }
 
-bool RegisterWsuIdsBelow(xmlDoc* document, xmlNode* node) {
-  for (; node != nullptr; node = node->next) {
-    if (node->type != XML_ELEMENT_NODE) continue;
-    for (xmlAttr* attribute = node->properties; attribute != nullptr; attribute = attribute->next) {
-      if (attribute->ns == nullptr || !xmlStrEqual(attribute->ns->href, Chars(SsoClient::Wire::kWsu.uri)) ||
-          !xmlStrEqual(attribute->name, Chars("Id"))) {
-        continue;
-      }
-      xmlChar* value = xmlNodeListGetString(document, attribute->children, 1);
-      const bool added = value != nullptr && xmlAddID(nullptr, document, value, attribute) != nullptr;
-      xmlFree(value);
-      if (!added) return false;
-    }
-    if (!RegisterWsuIdsBelow(document, node->children)) return false;
-  }
-  return true;
-}
-
 }  // namespace
 
-bool RegisterWsuIds(xmlDoc* document) { return RegisterWsuIdsBelow(document, xmlDocGetRootElement(document)); }
+bool RegisterWsuIds(xmlDoc* document) {
+  bool registered = true;
+  Tamber::Xml::ForEachInSubtree(xmlDocGetRootElement(document), [&](xmlNode* node) {
+    if (!registered || node->type != XML_ELEMENT_NODE) return;
+    for (xmlAttr* attribute = node->properties; attribute != nullptr && registered; attribute = attribute->next) {
+      if (attribute->ns != nullptr && xmlStrEqual(attribute->ns->href, Chars(SsoClient::Wire::kWsu.uri)) &&
+          xmlStrEqual(attribute->name, Chars("Id"))) {
+        const std::string value = Tamber::Xml::Security::GetAttributeValue(attribute);
+        // An empty value is refused too: xmlAddID takes none.
+        registered = xmlAddID(nullptr, document, Chars(value.c_str()), attribute) != nullptr;
+      }
+    }
+  });
+  return registered;
+}
 
 SignatureCheck VerifySignatureElement(xmlNode* signature, const std::vector<unsigned char>& certificateDer) {
   Tamber::Xml::Security::EnsureXmlSecInitialized();

@@ -185,13 +185,8 @@ TokenService::TokenService(const Config& config)
       _trusted{_signingCertificate},
       _negotiations(config.clockToleranceSec + 600) {
   for (const SolutionUser& user : config.solutionUsers) {
-    CertificateRef certificate;
-    try {
-      Tamber::Crypto::CreateCertificateFromPem(user.certificatePem, certificate);
-    } catch (const Tamber::Exception& e) {
-      throw std::runtime_error("Expected a PEM certificate for the solution user " + user.name + ": " + e.what());
-    }
-    _solutionUsers.emplace_back(user, certificate);
+    const std::string expected = "Expected a PEM certificate for the solution user " + user.name;
+    _solutionUsers.emplace_back(user, ParseCertificatePem(user.certificatePem, expected));
   }
 }
 
@@ -286,14 +281,15 @@ std::string TokenService::IssueByCertificate(const TrustRequest& trust, const Si
   const auto solution = std::find_if(_solutionUsers.begin(), _solutionUsers.end(), [&](const auto& candidate) {
     return SameCertificate(*candidate.second, *signer.certificate);
   });
+  const std::string commonName = CommonNameOf(*signer.certificate);
   TokenIssuer::TokenRecord record;
   if (solution != _solutionUsers.end()) {
     record = RecordFor(solution->first.name, AUTHN_X509);
     record.groups = solution->first.groups;
   } else if (IsClientCertificateOf(*signer.certificate, *_caCertificate) &&
-             CommonNameOf(*signer.certificate).find('@') != std::string::npos) {
+             commonName.find('@') != std::string::npos) {
     // Any client identity of the key directory's CA names its solution user.
-    record = RecordFor(CommonNameOf(*signer.certificate), AUTHN_X509);
+    record = RecordFor(commonName, AUTHN_X509);
   } else {
     throw StsFault(FAULT_FAILED_AUTHENTICATION,
                    "The signing certificate " + outcome.subject + " belongs to no solution user");
@@ -426,7 +422,6 @@ std::string TokenService::SignToken(TokenIssuer::TokenRecord& record, const Trus
 }
 
 void TokenService::Log(const Outcome& outcome, const std::string& result) {
-  std::lock_guard<std::mutex> lock(_logMutex);
   std::fprintf(stderr, "dev-sts: %s subject=%s outcome=%s\n", outcome.operation.c_str(), outcome.subject.c_str(),
                result.c_str());
 }

@@ -3,7 +3,6 @@
 
 // The STS's operations, independent of HTTP: one SOAP request in, one answer out.
 
-#include <mutex>
 #include <string>
 #include <utility>
 #include <vector>
@@ -73,7 +72,6 @@ class TokenService {
   SsoClient::CertificateList _trusted;
   std::vector<std::pair<SolutionUser, Tamber::Ref<const Tamber::Crypto::Certificate>>> _solutionUsers;
   Negotiations _negotiations;
-  std::mutex _logMutex;
 };
 
 }  // namespace DevSts

@@ -93,7 +93,6 @@ TrustRequest ReadIssueRequest(const xmlNode* rst) {
   }
   request.audience = ReadAudience(FindChild(rst, "Participants", WST));
   request.advice = ReadAdvice(FindChild(rst, "AdviceSet", Wire::kRsaAdvice.uri));
-  if (const xmlNode* useKey = FindChild(rst, "UseKey", WST)) request.useKeySignature = AttributeOf(useKey, "Sig");
   if (const xmlNode* exchange = FindChild(rst, "BinaryExchange", WST)) {
     request.binaryExchange = ReadBinaryExchange(exchange);
   }

@@ -23,8 +23,6 @@ struct TrustRequest {
   bool renewable = false;
   boost::optional<std::string> delegateTo;
   std::vector<TokenIssuer::AdviceRecord> advice;
-  // wst:UseKey/@Sig; empty without wst:UseKey.
-  std::string useKeySignature;
   // wst:BinaryExchange, decoded; set for a negotiation.
   boost::optional<SsoClient::Leg> binaryExchange;
 };
