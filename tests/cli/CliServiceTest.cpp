@@ -13,8 +13,8 @@
 #include <string>
 #include <vector>
 
-#include "DevSts.h"
 #include "cli/CliProcess.h"
+#include "e2e/DevStsEnvironment.h"
 #include "ssoClient/SamlToken.h"
 #include "tamber/crypto/Certificate.h"
 
@@ -26,26 +26,13 @@ using CliTest::RunCli;
 const char USER[] = "alice@example.com";
 const char PASSWORD[] = "alice-password";
 
-class CliService : public testing::Test {
+class CliService : public E2e::DevStsTest {
  protected:
-  static void SetUpTestSuite() {
-    _keys = new std::string(CliTest::TempPath("sts-keys"));
-    DevSts::GenerateKeys(*_keys);
-    _server = new DevSts::Server(DevSts::DefaultConfig(*_keys));
-    _server->Start();
-  }
-  static void TearDownTestSuite() {
-    delete _server;
-    _server = nullptr;
-    delete _keys;
-    _keys = nullptr;
-  }
-
-  static std::string Key(const char* file) { return *_keys + "/" + file; }
+  static std::string Key(const char* file) { return environment->KeyFile(file); }
 
   // The options that reach the suite's STS, then `arguments`.
   static std::vector<std::string> Against(const std::vector<std::string>& arguments) {
-    std::vector<std::string> all = {"--sts",      _server->GetUrl(),
+    std::vector<std::string> all = {"--sts",      StsUrl(),
                                     "--ca",       Key(DevSts::CA_CERTIFICATE_FILE),
                                     "--sts-cert", Key(DevSts::SIGNING_CERTIFICATE_FILE)};
     all.insert(all.end(), arguments.begin(), arguments.end());
@@ -58,17 +45,12 @@ class CliService : public testing::Test {
 
   // The token of a file, as a relying party trusting the STS's signer sees it.
   static boost::shared_ptr<const SsoClient::SamlToken> ParseTokenFile(const std::string& path) {
-    Tamber::Ref<const Tamber::Crypto::Certificate> signer;
-    Tamber::Crypto::CreateCertificateFromPem(CliTest::ReadFile(Key(DevSts::SIGNING_CERTIFICATE_FILE)), signer);
-    return SsoClient::CreateSamlToken(CliTest::ReadFile(path), signer.get());
+    return SsoClient::CreateSamlToken(DevSts::ReadTextFile(path),
+                                      environment->Certificate(DevSts::SIGNING_CERTIFICATE_FILE).get());
   }
 
-  static std::string* _keys;
-  static DevSts::Server* _server;
+  static std::string StsUrl() { return environment->GetServer().GetUrl(); }
 };
-
-std::string* CliService::_keys = nullptr;
-DevSts::Server* CliService::_server = nullptr;
 
 void ExpectOneErrorLine(const CliTest::CliResult& result, int exitCode, const std::string& prefix) {
   EXPECT_EQ(result.exitCode, exitCode);
@@ -162,10 +144,9 @@ TEST_F(CliService, StsThatNeverAnswersEndsWithExitCodeFiveAfterTheTimeout) {
 }
 
 TEST_F(CliService, PinnedTlsCertificateReplacesTheCaAndAWrongPinIsRefused) {
-  Tamber::Ref<const Tamber::Crypto::Certificate> tls;
-  Tamber::Crypto::CreateCertificateFromPem(CliTest::ReadFile(Key(DevSts::TLS_CERTIFICATE_FILE)), tls);
+  const Tamber::Ref<const Tamber::Crypto::Certificate> tls = environment->Certificate(DevSts::TLS_CERTIFICATE_FILE);
   const std::vector<std::string> pinned = {"--sts",
-                                           _server->GetUrl(),
+                                           StsUrl(),
                                            "--sts-cert",
                                            Key(DevSts::SIGNING_CERTIFICATE_FILE),
                                            "acquire-by-cert",
@@ -217,7 +198,7 @@ TEST_F(CliService, DumpSoapShowsEachMessageWithoutPasswordOrSignatureValue) {
   const CliTest::CliResult result = RunCli(Against(acquire), std::string(PASSWORD) + "\n");
   ASSERT_EQ(result.exitCode, 0) << result.err;
 
-  EXPECT_NE(result.err.find("=== request to " + _server->GetUrl()), std::string::npos) << result.err;
+  EXPECT_NE(result.err.find("=== request to " + StsUrl()), std::string::npos) << result.err;
   EXPECT_NE(result.err.find("=== answer 200"), std::string::npos) << result.err;
   EXPECT_NE(result.err.find("UsernameToken"), std::string::npos) << result.err;
   EXPECT_EQ(result.err.find(PASSWORD), std::string::npos) << "the password leaked";

@@ -4,11 +4,7 @@
 // A development STS with fresh keys on an ephemeral loopback port, and the configuration of a
 // client that trusts it over real HTTPS: the ground of the end-to-end suites.
 
-#include <stdlib.h>
-
-#include <filesystem>
 #include <memory>
-#include <stdexcept>
 #include <string>
 
 #include <gtest/gtest.h>
@@ -16,26 +12,10 @@
 #include "DevSts.h"
 #include "KeyDirectory.h"
 #include "ssoClient/SecurityTokenService.h"
+#include "support/TemporaryDirectory.h"
 #include "tamber/ssl/SSLContext.h"
 
 namespace E2e {
-
-class TemporaryDirectory {
- public:
-  TemporaryDirectory() {
-    char pattern[] = "/tmp/ssoclient-e2e-XXXXXX";
-    if (mkdtemp(pattern) == nullptr) throw std::runtime_error("cannot create a temporary directory");
-    _path = pattern;
-  }
-  ~TemporaryDirectory() { std::filesystem::remove_all(_path); }
-  TemporaryDirectory(const TemporaryDirectory&) = delete;
-  TemporaryDirectory& operator=(const TemporaryDirectory&) = delete;
-
-  const std::string& GetPath() const { return _path; }
-
- private:
-  std::string _path;
-};
 
 class DevStsEnvironment {
  public:
@@ -72,10 +52,9 @@ class DevStsEnvironment {
   }
 
   const DevSts::Server& GetServer() const { return *_server; }
-  Tamber::Ssl::SSLContext* GetSslContext() const { return _sslContext.get(); }
 
  private:
-  TemporaryDirectory _keys;
+  TestSupport::TemporaryDirectory _keys;
   std::unique_ptr<DevSts::Server> _server;
   Tamber::Ref<Tamber::Ssl::SSLContext> _sslContext;
 };

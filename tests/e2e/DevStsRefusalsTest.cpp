@@ -11,6 +11,7 @@
 #include "Negotiations.h"
 #include "TestMechanism.h"
 #include "ssoClient/RequestBuilderImpl.h"
+#include "support/FixedClock.h"
 #include "support/RequestSignatureCheck.h"
 #include "support/TestTokens.h"
 #include "tamber/StringUtil.h"
@@ -58,11 +59,11 @@ class StsRefusalsTest : public DevStsTest {
 
 TEST_F(StsRefusalsTest, ExpiredTimestampIsRefusedAsExpiredMessage) {
   Request request;
-  const int64_t twoHoursAgo = Tamber::System::GetUtcDateTime().GetUtcTime() - 2LL * 3600 * 1000000;
-  Tamber::System::Testing::SetTestClock(twoHoursAgo);
-  SsoClient::RequestBuilderImpl(boost::none).BuildUserPassTokenRequest("alice@example.com", "alice-password",
-                                                                       TokenSpec(), request);
-  Tamber::System::Testing::ResetTestClock();
+  {
+    const TestSupport::FixedClock twoHoursAgo(Tamber::System::GetUtcDateTime().GetUtcTime() - 2LL * 3600 * 1000000);
+    SsoClient::RequestBuilderImpl(boost::none).BuildUserPassTokenRequest("alice@example.com", "alice-password",
+                                                                         TokenSpec(), request);
+  }
 
   const RawAnswer answer = Post(request);
   EXPECT_EQ(answer.status, 500);

@@ -1,7 +1,5 @@
 // Runs the programs of examples/ as a user would, and keeps the README's copies of them honest.
-#include <sys/wait.h>
 
-#include <cstdio>
 #include <fstream>
 #include <sstream>
 #include <string>
@@ -9,6 +7,8 @@
 #include <gtest/gtest.h>
 
 #include "e2e/DevStsEnvironment.h"
+#include "support/ChildProcess.h"
+#include "support/TemporaryDirectory.h"
 #include "support/TestTokens.h"
 
 namespace {
@@ -31,29 +31,12 @@ std::string WriteFile(const std::string& path, const std::string& content) {
   return path;
 }
 
-std::string Quote(const std::string& word) { return "'" + word + "'"; }
+using TestSupport::ProcessResult;
+using TestSupport::RunProgram;
 
-struct Outcome {
-  int exitCode;
-  std::string out;
-  std::string err;
-};
-
-// Runs a shell command line; its standard error goes through a file of `scratch`.
-Outcome RunCommand(const E2e::TemporaryDirectory& scratch, const std::string& commandLine) {
-  const std::string errFile = scratch.GetPath() + "/stderr";
-  FILE* pipe = popen((commandLine + " 2>" + Quote(errFile)).c_str(), "r");
-  if (pipe == nullptr) throw std::runtime_error("popen failed");
-  std::string out;
-  char buffer[4096];
-  for (size_t n; (n = fread(buffer, 1, sizeof buffer, pipe)) > 0;) out.append(buffer, n);
-  const int status = pclose(pipe);
-  return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, out, ReadFile(errFile)};
-}
-
-Outcome ValidateToken(const E2e::TemporaryDirectory& scratch, const std::string& token, const std::string& trustedPem) {
-  return RunCommand(scratch, Quote(EXAMPLES_DIR + "ValidateToken") + " " +
-                                 Quote(WriteFile(scratch.GetPath() + "/token.xml", token)) + " " + Quote(trustedPem));
+ProcessResult ValidateToken(const TestSupport::TemporaryDirectory& scratch, const std::string& token,
+                            const std::string& trustedPem) {
+  return RunProgram(EXAMPLES_DIR + "ValidateToken", {WriteFile(scratch.GetPath() + "/token.xml", token), trustedPem});
 }
 
 class ValidateTokenExampleTest : public ::testing::Test {
@@ -65,13 +48,13 @@ class ValidateTokenExampleTest : public ::testing::Test {
     return TestSupport::IssueTestToken(record);
   }
 
-  E2e::TemporaryDirectory _scratch;
+  TestSupport::TemporaryDirectory _scratch;
 };
 
 TEST_F(ValidateTokenExampleTest, PrintsTheFactsOfATokenSignedByTheTrustedSigner) {
   for (const char* trusted : {"sts.pem", "ca.pem"}) {
     SCOPED_TRACE(trusted);
-    const Outcome outcome = ValidateToken(_scratch, FreshToken(), KEYS_DIR + trusted);
+    const ProcessResult outcome = ValidateToken(_scratch, FreshToken(), KEYS_DIR + trusted);
     EXPECT_EQ(0, outcome.exitCode) << outcome.err;
     EXPECT_EQ("", outcome.err);
     EXPECT_NE(std::string::npos, outcome.out.find("subject: {Name: alice; Domain:example.com}\n")) << outcome.out;
@@ -84,7 +67,7 @@ TEST_F(ValidateTokenExampleTest, PrintsTheFactsOfATokenSignedByTheTrustedSigner)
 }
 
 TEST_F(ValidateTokenExampleTest, RejectsAForeignSignerAndATamperedToken) {
-  const Outcome untrusted = ValidateToken(_scratch, FreshToken(), KEYS_DIR + "untrusted.pem");
+  const ProcessResult untrusted = ValidateToken(_scratch, FreshToken(), KEYS_DIR + "untrusted.pem");
   EXPECT_EQ(4, untrusted.exitCode);
   EXPECT_EQ("token rejected: " + SIGNATURE_REJECTED, untrusted.err);
   EXPECT_EQ("", untrusted.out);
@@ -93,18 +76,18 @@ TEST_F(ValidateTokenExampleTest, RejectsAForeignSignerAndATamperedToken) {
   const size_t subject = tampered.find("alice@example.com");
   ASSERT_NE(std::string::npos, subject);
   tampered.replace(subject, 5, "mallo");
-  const Outcome edited = ValidateToken(_scratch, tampered, KEYS_DIR + "sts.pem");
+  const ProcessResult edited = ValidateToken(_scratch, tampered, KEYS_DIR + "sts.pem");
   EXPECT_EQ(4, edited.exitCode);
   EXPECT_EQ("token rejected: " + SIGNATURE_REJECTED, edited.err);
 }
 
 TEST_F(ValidateTokenExampleTest, ExplainsUsageAndUnreadableFiles) {
-  const Outcome usage = RunCommand(_scratch, Quote(EXAMPLES_DIR + "ValidateToken"));
+  const ProcessResult usage = RunProgram(EXAMPLES_DIR + "ValidateToken", {});
   EXPECT_EQ(2, usage.exitCode);
   EXPECT_EQ("usage: ValidateToken TOKEN_XML TRUSTED_CERTS_PEM\n", usage.err);
 
   const std::string missing = _scratch.GetPath() + "/no-such.pem";
-  const Outcome unreadable = ValidateToken(_scratch, FreshToken(), missing);
+  const ProcessResult unreadable = ValidateToken(_scratch, FreshToken(), missing);
   EXPECT_EQ(1, unreadable.exitCode);
   EXPECT_EQ("failed: cannot read " + missing + "\n", unreadable.err);
 }
@@ -113,34 +96,35 @@ TEST_F(ValidateTokenExampleTest, ExplainsUsageAndUnreadableFiles) {
 // what it wrote.
 class AcquireTokenExampleTest : public E2e::DevStsTest {
  protected:
-  Outcome AcquireToken(const std::string& password, const std::string& trustedTokenSigner) {
-    return RunCommand(_scratch, "echo " + Quote(password) + " | " + Quote(EXAMPLES_DIR + "AcquireToken") + " " +
-                                    Quote(environment->GetServer().GetUrl()) + " " +
-                                    Quote(environment->KeyFile(DevSts::CA_CERTIFICATE_FILE)) + " " +
-                                    Quote(trustedTokenSigner) + " alice@example.com");
+  ProcessResult AcquireToken(const std::string& password, const std::string& trustedTokenSigner) {
+    return RunProgram(EXAMPLES_DIR + "AcquireToken",
+                      {environment->GetServer().GetUrl(), environment->KeyFile(DevSts::CA_CERTIFICATE_FILE),
+                       trustedTokenSigner, "alice@example.com"},
+                      password + "\n");
   }
 
-  E2e::TemporaryDirectory _scratch;
+  TestSupport::TemporaryDirectory _scratch;
 };
 
 TEST_F(AcquireTokenExampleTest, AcquiresATokenThatValidateTokenAccepts) {
   const std::string signer = environment->KeyFile(DevSts::SIGNING_CERTIFICATE_FILE);
-  const Outcome acquired = AcquireToken("alice-password", signer);
+  const ProcessResult acquired = AcquireToken("alice-password", signer);
   ASSERT_EQ(0, acquired.exitCode) << acquired.err;
   EXPECT_EQ("", acquired.err);
 
-  const Outcome validated = ValidateToken(_scratch, acquired.out, signer);
+  const ProcessResult validated = ValidateToken(_scratch, acquired.out, signer);
   EXPECT_EQ(0, validated.exitCode) << validated.err;
   EXPECT_NE(std::string::npos, validated.out.find("subject: {Name: alice; Domain:example.com}\n")) << validated.out;
 }
 
 TEST_F(AcquireTokenExampleTest, TellsAWrongPasswordFromAnUntrustedSigner) {
-  const Outcome refused = AcquireToken("not-her-password", environment->KeyFile(DevSts::SIGNING_CERTIFICATE_FILE));
+  const ProcessResult refused =
+      AcquireToken("not-her-password", environment->KeyFile(DevSts::SIGNING_CERTIFICATE_FILE));
   EXPECT_EQ(3, refused.exitCode);
   EXPECT_EQ(0u, refused.err.rfind("wrong user name or password: ", 0)) << refused.err;
   EXPECT_EQ("", refused.out);
 
-  const Outcome untrusted = AcquireToken("alice-password", KEYS_DIR + "untrusted.pem");
+  const ProcessResult untrusted = AcquireToken("alice-password", KEYS_DIR + "untrusted.pem");
   EXPECT_EQ(1, untrusted.exitCode);
   EXPECT_EQ("failed: " + SIGNATURE_REJECTED, untrusted.err);
   EXPECT_EQ("", untrusted.out);

@@ -6,13 +6,12 @@
 #include <cstdio>
 #include <cstdlib>
 #include <fstream>
-#include <memory>
 #include <stdexcept>
 
 #include <libxml/parser.h>
 #include <libxml/tree.h>
-#include <xmlsec/xmltree.h>
 
+#include "SoapRequest.h"
 #include "ssoClient/SamlConstants.h"
 #include "ssoClient/WireConstants.h"
 #include "tamber/StringUtil.h"
@@ -22,16 +21,6 @@ namespace TestSupport {
 namespace {
 
 namespace Wire = SsoClient::Wire;
-
-struct DocumentDeleter {
-  void operator()(xmlDoc* doc) const { xmlFreeDoc(doc); }
-};
-
-const xmlChar* Chars(const char* text) { return reinterpret_cast<const xmlChar*>(text); }
-
-xmlNodePtr FindChild(xmlNodePtr parent, const char* localName, const char* ns) {
-  return parent == nullptr ? nullptr : xmlSecFindChild(parent, Chars(localName), Chars(ns));
-}
 
 std::string ToPem(const Tamber::Crypto::Certificate& certificate) {
   const std::string base64 = Tamber::StringUtil::Base64Encode(certificate.GetDer());
@@ -55,7 +44,7 @@ std::string WriteTemporaryFile(const std::string& content) {
 RequestSignatureResult VerifyRequestSignature(const std::string& requestXml,
                                               const Tamber::Crypto::Certificate& certificate) {
   RequestSignatureResult result;
-  std::unique_ptr<xmlDoc, DocumentDeleter> doc(
+  const DevSts::XmlDocument doc(
       xmlReadMemory(requestXml.data(), static_cast<int>(requestXml.size()), nullptr, nullptr, XML_PARSE_NONET));
   if (!doc) {
     result.error = "the request is not well-formed XML";
@@ -65,9 +54,9 @@ RequestSignatureResult VerifyRequestSignature(const std::string& requestXml,
     result.error = "a wsu:Id value is used twice";
     return result;
   }
-  xmlNodePtr header = FindChild(xmlDocGetRootElement(doc.get()), "Header", Wire::kSoapEnvelope.uri);
-  xmlNodePtr security = FindChild(header, "Security", Wire::kWsse.uri);
-  xmlNodePtr signature = FindChild(security, "Signature", SsoClient::Saml::DSIG_NS);
+  const xmlNode* header = DevSts::FindChild(xmlDocGetRootElement(doc.get()), "Header", Wire::kSoapEnvelope.uri);
+  const xmlNode* security = DevSts::FindChild(header, "Security", Wire::kWsse.uri);
+  xmlNode* signature = DevSts::FindChild(security, "Signature", SsoClient::Saml::DSIG_NS);
   if (signature == nullptr) {
     result.error = "no ds:Signature in soapenv:Header/wsse:Security";
     return result;

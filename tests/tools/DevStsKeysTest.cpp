@@ -10,18 +10,16 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
-#include "../e2e/DevStsEnvironment.h"
+#include "DevSts.h"
+#include "KeyDirectory.h"
+#include "support/TemporaryDirectory.h"
+#include "tamber/crypto/OpenSsl.h"
 
 namespace {
 
 using ::testing::HasSubstr;
 
-struct X509Deleter {
-  void operator()(X509* certificate) const { X509_free(certificate); }
-  void operator()(X509_STORE* store) const { X509_STORE_free(store); }
-  void operator()(X509_STORE_CTX* context) const { X509_STORE_CTX_free(context); }
-};
-using X509Ptr = std::unique_ptr<X509, X509Deleter>;
+using Tamber::Crypto::X509Ptr;
 
 X509Ptr ReadX509(const std::string& path) {
   std::unique_ptr<FILE, int (*)(FILE*)> file(fopen(path.c_str(), "r"), fclose);
@@ -31,8 +29,8 @@ X509Ptr ReadX509(const std::string& path) {
 
 // Whether `leaf` chains to `ca` for `purpose` (X509_PURPOSE_...).
 bool Chains(X509* leaf, X509* ca, int purpose) {
-  std::unique_ptr<X509_STORE, X509Deleter> store(X509_STORE_new());
-  std::unique_ptr<X509_STORE_CTX, X509Deleter> context(X509_STORE_CTX_new());
+  const Tamber::Crypto::X509StorePtr store(X509_STORE_new());
+  const Tamber::Crypto::X509StoreCtxPtr context(X509_STORE_CTX_new());
   X509_STORE_add_cert(store.get(), ca);
   X509_STORE_CTX_init(context.get(), store.get(), leaf, nullptr);
   X509_STORE_CTX_set_purpose(context.get(), purpose);
@@ -43,7 +41,7 @@ class DevStsKeysTest : public ::testing::Test {
  protected:
   std::string Path(const char* file) const { return DevSts::KeyPath(_directory.GetPath(), file); }
 
-  E2e::TemporaryDirectory _directory;
+  TestSupport::TemporaryDirectory _directory;
 };
 
 TEST_F(DevStsKeysTest, GeneratedIdentitiesChainToTheCaForTheirPurpose) {
